@@ -1,0 +1,182 @@
+// Measurement control: start, multi-mainframe arming, trigger, block poll and read, reset.
+#include "call.h"
+#include "ost7720.h"
+
+using namespace sim;
+
+namespace {
+
+std::vector<int32_t> member_ids(Session& s, int32_t id) {
+    auto g = s.groups.find(id);
+    if (g != s.groups.end())
+        return g->second;
+    return {id};
+}
+
+// One channel (not a group) of the session, of the kinds given.
+Channel* single_channel(Api& api, Session& s, int32_t id, unsigned kinds, const char* role) {
+    if (s.groups.count(id)) {
+        api.refuse(err_invalid_channel,
+                   std::string(role) + " " + std::to_string(id) + " is a group, not a channel");
+        return nullptr;
+    }
+    std::vector<Channel*> chans;
+    if (!api.targets(s, id, kinds, chans, true))
+        return nullptr;
+    return chans.front();
+}
+
+const char* step_name(ArmStep step) {
+    switch (step) {
+        case ArmStep::none:
+            return "ost7720_initMeasure";
+        case ArmStep::master_setup:
+            return "ost7720_armMeasureMasterSetup";
+        case ArmStep::armed:
+            return "ost7720_armMeasure";
+        case ArmStep::slave_finished:
+            return "ost7720_armMeasureSlaveFinish";
+        case ArmStep::master_finished:
+            return "ost7720_armMeasureMasterFinish";
+    }
+    return "";
+}
+
+// Multi-mainframe arming goes initMeasure (arm mode 430), master set-up, arm, slave finish,
+// master finish; each step is taken only right after the one before it.
+int32_t arm_step(Api& api, Session& s, ArmStep from, ArmStep to) {
+    Measurement& m = s.measurement;
+    if (!m.started)
+        return api.refuse(err_measurement_state, "no measurement: call ost7720_initMeasure first");
+    if (!m.multi_mainframe)
+        return api.refuse(err_measurement_state, "the measurement was not started with arm mode 430");
+    if (m.arm != from)
+        return api.refuse(err_measurement_state,
+                          std::string("must follow ") + step_name(from) + ", not " + step_name(m.arm));
+    m.arm = to;
+    return api.done();
+}
+
+}  // namespace
+
+extern "C" {
+
+int32_t OST7720_CALL ost7720_initMeasure(int32_t session, int32_t channel) {
+    Api api("ost7720_initMeasure", session, {trace_int(session), trace_int(channel)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    std::vector<Channel*> chans;
+    if (!s || !api.targets(*s, channel, k_any, chans))
+        return api.status();
+    Measurement& m = s->measurement;
+    m = Measurement{};
+    m.started = true;
+    m.channels = member_ids(*s, channel);
+    for (Channel* c : chans) {
+        if (c->measure.arm_mode == code::arm_multi)
+            m.multi_mainframe = true;
+    }
+    return api.done();
+}
+
+int32_t OST7720_CALL ost7720_armMeasure(int32_t session, int32_t channel, int32_t reserved) {
+    Api api("ost7720_armMeasure", session, {trace_int(session), trace_int(channel), trace_int(reserved)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    std::vector<Channel*> chans;
+    if (!s || !api.targets(*s, channel, k_any, chans))
+        return api.status();
+    return arm_step(api, *s, ArmStep::master_setup, ArmStep::armed);
+}
+
+int32_t OST7720_CALL ost7720_armMeasureMasterSetup(int32_t session, int32_t master) {
+    Api api("ost7720_armMeasureMasterSetup", session, {trace_int(session), trace_int(master)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    if (!s || !single_channel(api, *s, master, k_any, "master"))
+        return api.status();
+    return arm_step(api, *s, ArmStep::none, ArmStep::master_setup);
+}
+
+int32_t OST7720_CALL ost7720_armMeasureSlaveFinish(int32_t session, int32_t slave) {
+    Api api("ost7720_armMeasureSlaveFinish", session, {trace_int(session), trace_int(slave)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    if (!s || !single_channel(api, *s, slave, k_any, "slave"))
+        return api.status();
+    return arm_step(api, *s, ArmStep::armed, ArmStep::slave_finished);
+}
+
+int32_t OST7720_CALL ost7720_armMeasureMasterFinish(int32_t session, int32_t master) {
+    Api api("ost7720_armMeasureMasterFinish", session, {trace_int(session), trace_int(master)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    if (!s || !single_channel(api, *s, master, k_any, "master"))
+        return api.status();
+    return arm_step(api, *s, ArmStep::slave_finished, ArmStep::master_finished);
+}
+
+int32_t OST7720_CALL ost7720_triggerMeasure(int32_t session, int32_t channel, int32_t reserved) {
+    Api api("ost7720_triggerMeasure", session, {trace_int(session), trace_int(channel), trace_int(reserved)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    std::vector<Channel*> chans;
+    if (!s || !api.targets(*s, channel, k_any, chans))
+        return api.status();
+    if (!s->measurement.started)
+        return api.refuse(err_measurement_state, "no measurement is running");
+    return api.done();
+}
+
+int32_t OST7720_CALL ost7720_blockAvailable(int32_t session, int32_t channel, int32_t* available) {
+    Api api("ost7720_blockAvailable", session, {trace_int(session), trace_int(channel)});
+    if (api.injected())
+        return api.status();
+    std::vector<Channel*> chans;
+    if (!api.resolve(session, channel, k_any, chans, true))
+        return api.status();
+    if (!api.not_null(available, "available"))
+        return api.status();
+    *available = 0;
+    api.out(*available);
+    return api.done();
+}
+
+int32_t OST7720_CALL ost7720_readFloat64Data(int32_t session, int32_t channel, int32_t data_type,
+                                             double* data, int32_t count, int32_t* actual, int32_t wait) {
+    Api api(
+        "ost7720_readFloat64Data", session,
+        {trace_int(session), trace_int(channel), trace_int(data_type), trace_int(count), trace_int(wait)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    if (!s || !single_channel(api, *s, channel, k_input, "channel"))
+        return api.status();
+    if (data_type != code::read_time && data_type != code::read_frequency)
+        return api.refuse(err_invalid_code, "data type code " + std::to_string(data_type) + " unknown");
+    if (count < 0)
+        return api.refuse(err_invalid_count, "count " + std::to_string(count) + " below 0");
+    if ((count > 0 && !api.not_null(data, "data")) || !api.not_null(actual, "actual"))
+        return api.status();
+    return api.refuse(err_no_data, "no block of channel " + std::to_string(channel) + " is available");
+}
+
+int32_t OST7720_CALL ost7720_resetMeasure(int32_t session, int32_t channel) {
+    Api api("ost7720_resetMeasure", session, {trace_int(session), trace_int(channel)});
+    if (api.injected())
+        return api.status();
+    Session* s = api.session(session);
+    std::vector<Channel*> chans;
+    if (!s || !api.targets(*s, channel, k_any, chans))
+        return api.status();
+    s->measurement = Measurement{};
+    return api.done();
+}
+
+}  // extern "C"
