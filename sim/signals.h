@@ -12,9 +12,10 @@
 //   - Random: white Gaussian noise, one independent value per source sample (flat up to half the
 //     sample rate), rms range / 4 and cut at +-range, drawn from a counter-based hash of
 //     (seed, sample index): the same seed gives the same noise at the same time.
-//   - Zoom random: the random noise low-passed by a moving average of `zoom_taps` samples (a band
-//     of about +-sample_rate / zoom_taps) and shifted up to the sine frequency by multiplying with
-//     sqrt(2) cos(2 pi f t) (no shift at frequency 0); same rms and cut as random.
+//   - Zoom random: the random noise low-passed by a Hann-weighted moving average of `zoom_taps`
+//     samples (a band of +-2 * sample_rate / zoom_taps to the first nulls, +-3200 Hz at span
+//     20000 Hz) and shifted up to the sine frequency by multiplying with sqrt(2) cos(2 pi f t) (no
+//     shift at frequency 0); same rms and cut as random.
 //   - Arbitrary: the table played cyclically, one entry per source sample (at span 20000 Hz and
 //     block size 1024 one block shows the table once); entry v gives v / 2^31 * range * amp_scale.
 //     An empty table plays silence.
@@ -37,7 +38,7 @@
 namespace sim::signals {
 
 inline constexpr int32_t default_block_size = 1024;  // source samples per burst period
-inline constexpr int zoom_taps = 16;
+inline constexpr int zoom_taps = 32;
 inline constexpr double default_input_noise_rms = 1e-3;  // volts
 
 struct SourceParams {
