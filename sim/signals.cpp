@@ -84,6 +84,17 @@ double peak(const SourceParams& p) {
     return p.range > 0.0 ? p.range : 0.0;
 }
 
+// Sine frequency; a negative or undefined one counts as 0 (a constant).
+double frequency(const SourceParams& p) {
+    return p.frequency > 0.0 ? p.frequency : 0.0;
+}
+
+// Source samples on at the start of each burst period: positions below duty * block_size.
+int64_t on_samples(const SourceParams& p) {
+    const int64_t block = std::max<int32_t>(p.block_size, 1);
+    return std::min(block, static_cast<int64_t>(std::ceil(duty(p) * static_cast<double>(block))));
+}
+
 bool burst_on(const SourceParams& p, int64_t k) {
     const int64_t block = std::max<int32_t>(p.block_size, 1);
     return static_cast<double>(wrap(k, block)) < duty(p) * static_cast<double>(block);
@@ -152,20 +163,14 @@ double output_mean(const SourceParams& p) {
         return 0.0;
     }
     const int32_t mode = base_mode(p.mode);
-    const int64_t block = std::max<int32_t>(p.block_size, 1);
     const bool burst = is_burst(p.mode);
+    const int64_t block = std::max<int32_t>(p.block_size, 1);
+    const int64_t on = burst ? on_samples(p) : block;
     if (mode == code::mode_sine) {
-        if (p.frequency > 0.0) {
+        if (frequency(p) > 0.0) {
             return 0.0;
         }
         const double level = peak(p) * std::sin(p.phase_deg * std::numbers::pi / 180.0);
-        if (!burst) {
-            return level;
-        }
-        int64_t on = 0;
-        for (int64_t k = 0; k < block; ++k) {
-            on += burst_on(p, k) ? 1 : 0;
-        }
         return level * static_cast<double>(on) / static_cast<double>(block);
     }
     if (mode != code::mode_arbitrary || p.arb_table.empty()) {
@@ -173,26 +178,23 @@ double output_mean(const SourceParams& p) {
     }
     const double scale = peak(p) * p.amp_scale / full_scale;
     const auto size = static_cast<int64_t>(p.arb_table.size());
-    double sum = 0.0;
-    if (!burst) {
-        for (int32_t v : p.arb_table) {
-            sum += v;
-        }
-        return sum / static_cast<double>(size) * scale;
-    }
-    if (block % size == 0) {
-        for (int64_t k = 0; k < block; ++k) {
-            if (burst_on(p, k)) {
-                sum += p.arb_table[wrap(k, size)];
-            }
-        }
-        return sum / static_cast<double>(block) * scale;
-    }
-    // Burst and table periods that do not nest: the long-run mean is close to this.
+    double table_sum = 0.0;
     for (int32_t v : p.arb_table) {
-        sum += v;
+        table_sum += v;
     }
-    return duty(p) * sum / static_cast<double>(size) * scale;
+    if (!burst) {
+        return table_sum / static_cast<double>(size) * scale;
+    }
+    if (block % size != 0) {
+        // Bursts start at a different table entry each time: the long-run mean is close to this.
+        return duty(p) * table_sum / static_cast<double>(size) * scale;
+    }
+    // Every burst plays the same entries: whole tables, then the start of one.
+    double sum = static_cast<double>(on / size) * table_sum;
+    for (int64_t k = 0; k < on % size; ++k) {
+        sum += p.arb_table[k];
+    }
+    return sum / static_cast<double>(block) * scale;
 }
 
 void render_source(const SourceParams& p, double t0, double dt, std::span<double> out, bool ac_coupled) {
@@ -223,7 +225,7 @@ void render_source(const SourceParams& p, double t0, double dt, std::span<double
         double v = 0.0;
         if (!burst || burst_on(p, k)) {
             if (mode == code::mode_sine) {
-                v = range * std::sin(two_pi * turns(p.frequency, t, phase_turns));
+                v = range * std::sin(two_pi * turns(frequency(p), t, phase_turns));
             } else if (mode == code::mode_random) {
                 v = cut(noise_rms * gaussian(stream, static_cast<uint64_t>(k)), range);
             } else if (mode == code::mode_zoom_random) {

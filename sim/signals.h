@@ -8,7 +8,8 @@
 //   - Every source runs on a sample clock of `sample_rate` (the simulator gives it the
 //     measurement's rate, 2.56 x span, as the module shares one clock). Sample k of the source
 //     covers absolute times [k, k+1) / sample_rate; a sine is evaluated at the exact time instead.
-//   - Sine: range * sin(2 pi f t + phase).
+//   - Sine: range * sin(2 pi f t + phase); a frequency of 0 or below gives the constant
+//     range * sin(phase).
 //   - Random: white Gaussian noise, one independent value per source sample (flat up to half the
 //     sample rate), rms range / 4 and cut at +-range, drawn from a counter-based hash of
 //     (seed, sample index): the same seed gives the same noise at the same time.
@@ -76,7 +77,9 @@ double ramp_gain(const SourceParams& p, double t);
 // its phase 2 pi f t + phase passes a whole number of turns (the rising zero crossing), +infinity
 // when the frequency is 0 or below; for Arbitrary, the table's start (every table-size samples);
 // for every other mode, the start of each block_size-sample source block (the burst start for
-// burst forms). Times are absolute seconds; +infinity when there is no next period.
+// burst forms). Times are absolute seconds, never before active_since; +infinity when there is no
+// next period. The output connection does not matter: the generator runs on behind a grounded or
+// open output.
 double next_period_start(const SourceParams& p, double t);
 
 // Adds reproducible Gaussian noise of `rms` volts: sample i gets the value for the absolute sample

@@ -228,6 +228,12 @@ TEST(SimSignals, AcCouplingRemovesTheDcPart) {
     p.range = 3.0;
     EXPECT_NEAR(render(p, 1.0, 1)[0], 3.0, 1e-12);
     EXPECT_NEAR(render(p, 1.0, 1, true)[0], 0.0, 1e-12);
+    p.frequency = -50.0;  // no such thing: taken as 0 Hz
+    EXPECT_NEAR(render(p, 1.3, 1)[0], 3.0, 1e-12);
+    p.mode = code::mode_burst_sine;
+    p.duty_cycle = 0.25;
+    EXPECT_NEAR(sg::output_mean(p), 0.75, 1e-12);
+    p.mode = code::mode_sine;
     p.frequency = 100.0;
     EXPECT_EQ(sg::output_mean(p), 0.0);
 }
