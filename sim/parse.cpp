@@ -95,7 +95,7 @@ bool check_modules(const std::vector<ModuleSpec>& modules, std::string& error) {
         if (m.sources < 0 || m.sources > max_sources_per_module)
             return bad("sources", m.sources, 0, max_sources_per_module);
         if (m.tachs < 0 || m.tachs > max_tachs_per_module)
-            return bad("tachometers", m.tachs, 0, max_tachs_per_module);
+            return bad("tachs", m.tachs, 0, max_tachs_per_module);
         if (m.megabytes < 1 || m.megabytes > max_megabytes)
             return bad("megabytes", m.megabytes, 1, max_megabytes);
         if (!seen.insert(m.address).second) {
