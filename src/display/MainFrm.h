@@ -14,7 +14,7 @@
 
 class MainFrm : public Form {
     Q_OBJECT
-public:
+  public:
     MainFrm();
     ~MainFrm() override;
 
@@ -57,7 +57,20 @@ public:
     QPushButton* SrcBtn;
     QPushButton* InpBtn;
 
-protected:
+  protected:
     // Closing the main window ends the program like Exit.
     void closeEvent(QCloseEvent* event) override;
+
+  private:
+    // Sets a scale box's text; when the text is already there (no change event), runs the
+    // change handler all the same, so the box's value always reaches its slot.
+    void fill_scale_box(QLineEdit* box, const QString& text, int16_t position, bool high);
+    void scale_box_changed(QLineEdit* box, std::array<double, 5>& limits, int16_t position);
+
+    // The trace slot shown at each display position (a position not in use maps to itself).
+    // The scale boxes beside a picture show and set that picture's slot.
+    std::array<int, 4> slot_at_{0, 1, 2, 3};
+    // The slot whose drawing each picture holds; -1 for none yet.
+    std::array<int, 4> drawn_slot_{-1, -1, -1, -1};
+    int rewrite_depth_ = 0;
 };
