@@ -8,7 +8,7 @@
 
 class Form : public QWidget {
     Q_OBJECT
-public:
+  public:
     explicit Form(const QString& caption);
 
     // Outer frame, in twips.
@@ -40,10 +40,10 @@ public:
     void run_resize();
     void hold_layout(bool hold) { layout_held_ = hold; }
 
-protected:
+  protected:
     void resizeEvent(QResizeEvent* event) override;
 
-private:
+  private:
     bool in_resize_ = false;
     bool layout_held_ = false;
 };

@@ -2,8 +2,8 @@
 
 #include <QApplication>
 #include <QMessageBox>
-#include <cstdlib>
 #include <cstdio>
+#include <cstdlib>
 
 namespace dialogs {
 namespace {
@@ -14,12 +14,18 @@ Responder& responder() {
 }
 
 // Messages break lines with CR LF; the box wants plain line feeds.
-QString to_q(const std::string& s) { return QString::fromStdString(s).replace(QStringLiteral("\r\n"), QStringLiteral("\n")); }
+QString to_q(const std::string& s) {
+    return QString::fromStdString(s).replace(QStringLiteral("\r\n"), QStringLiteral("\n"));
+}
 
 }  // namespace
 
-void set_responder(Responder r) { responder() = std::move(r); }
-void clear_responder() { responder() = nullptr; }
+void set_responder(Responder r) {
+    responder() = std::move(r);
+}
+void clear_responder() {
+    responder() = nullptr;
+}
 
 void notice(const std::string& text) {
     if (responder()) {
@@ -31,7 +37,8 @@ void notice(const std::string& text) {
 }
 
 bool ask_yes_no(const std::string& text) {
-    if (responder()) return responder()(Kind::question, text) == Answer::yes;
+    if (responder())
+        return responder()(Kind::question, text) == Answer::yes;
     QMessageBox box(QMessageBox::Critical, QString::fromUtf8(app_title), to_q(text),
                     QMessageBox::Yes | QMessageBox::No);
     return box.exec() == QMessageBox::Yes;
@@ -44,4 +51,6 @@ void end_program() {
     std::_Exit(0);
 }
 
-void do_events() { QCoreApplication::processEvents(); }
+void do_events() {
+    QCoreApplication::processEvents();
+}

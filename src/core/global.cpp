@@ -37,7 +37,8 @@ void set_defaults() {
     group_sources = 0;
     group_tachs = 0;
     status = 0;
-    for (int t = 0; t <= 3; ++t) trace_file[t].clear();
+    for (int t = 0; t <= 3; ++t)
+        trace_file[t].clear();
     multi_mainframe = 0;
 }
 

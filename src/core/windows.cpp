@@ -29,15 +29,20 @@ void add(std::type_index type, std::unique_ptr<Form> form) {
     registry().owned.push_back(std::move(form));
 }
 
-Form& main_form() { return *registry().main; }
-void set_main_form(Form* form) { registry().main = form; }
+Form& main_form() {
+    return *registry().main;
+}
+void set_main_form(Form* form) {
+    registry().main = form;
+}
 
 void destroy_all() {
     Registry& r = registry();
     r.by_type.clear();
     r.main = nullptr;
     // Newest first, so a page goes before the main window it may refer to.
-    while (!r.owned.empty()) r.owned.pop_back();
+    while (!r.owned.empty())
+        r.owned.pop_back();
 }
 
 }  // namespace forms

@@ -13,7 +13,8 @@ void add(std::type_index type, std::unique_ptr<Form> form);
 
 template <class F>
 F& get() {
-    if (Form* f = find(typeid(F))) return static_cast<F&>(*f);
+    if (Form* f = find(typeid(F)))
+        return static_cast<F&>(*f);
     auto owned = std::make_unique<F>();
     F& ref = *owned;
     add(typeid(F), std::move(owned));

@@ -8,8 +8,10 @@ void PanelTest::SetUp() {
     use_system(sim::default_system());
     dialogs::set_responder([this](dialogs::Kind kind, const std::string& text) {
         messages.push_back({kind, text});
-        if (kind == dialogs::Kind::notice) return dialogs::Answer::ok;
-        if (answers_.empty()) return dialogs::Answer::yes;
+        if (kind == dialogs::Kind::notice)
+            return dialogs::Answer::ok;
+        if (answers_.empty())
+            return dialogs::Answer::yes;
         dialogs::Answer a = answers_.front();
         answers_.pop_front();
         return a;

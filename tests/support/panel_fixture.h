@@ -18,7 +18,7 @@ struct Message {
 };
 
 class PanelTest : public testing::Test {
-protected:
+  protected:
     void SetUp() override;
     void TearDown() override;
 
@@ -30,6 +30,6 @@ protected:
 
     std::vector<Message> messages;
 
-private:
+  private:
     std::deque<dialogs::Answer> answers_;
 };
