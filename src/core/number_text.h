@@ -18,16 +18,19 @@ std::string str(double value);
 // The same without the leading blank.
 std::string text(double value);
 
-// Appends str(value) to out without allocating; returns the number of characters written.
-// buffer must hold at least 32 characters.
+// Writes str(value) at buffer without allocating and returns its length (at most 22); no NUL
+// is added. buffer must hold at least 32 characters: all of them may be used as scratch.
 int format_to(char* buffer, double value);
 
-// The number at the start of a text: leading blanks skipped, optional sign, digits with "."
-// as the point, an optional exponent (E or D); 0 when the text does not start with a number.
+// The number at the start of a text: leading blanks (spaces, tabs, CR, LF) skipped, optional
+// sign, digits with "." as the point, an optional exponent (E or D, either case); 0 when the
+// text does not start with a number. A number beyond the double range reads as the largest
+// finite double of its sign, one below the smallest subnormal as 0, so the result is always
+// finite.
 double val(std::string_view text);
 
 // Strict whole-text conversion for the scale boxes: the whole text (blanks around it allowed)
-// must be a number; otherwise nothing.
+// must be a number as val reads it, and within the double range; otherwise nothing.
 std::optional<double> to_number(std::string_view text);
 
 // Rounding to the nearest integer, an exact half to the even neighbour; nothing when the

@@ -1,0 +1,466 @@
+#include "core/number_text.h"
+
+#include <array>
+#include <bit>
+#include <cfloat>
+#include <charconv>
+#include <cmath>
+#include <cstdio>
+#include <cstring>
+
+namespace numtext {
+
+namespace {
+
+__extension__ typedef unsigned __int128 u128;
+
+// ---------------------------------------------------------------------------------------------
+// Powers of ten for the number text.
+//
+// 10^k is held as a 128-bit mantissa t (2^127 <= t < 2^128) and a binary exponent b with
+// t = floor(10^k / 2^b); the mantissa is exact for 0 <= k <= 55 (5^55 < 2^128) and a truncation
+// (too small by less than one unit) elsewhere. The table is worked out by the compiler with a
+// small big-integer type, so it costs nothing at run time.
+
+constexpr int pow10_min = -300;  // 10^-300 scales the largest doubles down to 15 digits
+constexpr int pow10_max = 340;   // 10^340 scales the smallest subnormals up to 15 digits
+constexpr int exact_pow10_max = 55;
+
+struct Pow10 {
+    uint64_t hi;
+    uint64_t lo;
+    int32_t exp2;
+};
+
+// Little-endian 32-bit words, wide enough for 2^1024 and 5^340.
+struct BigInt {
+    std::array<uint32_t, 40> w{};
+
+    constexpr int bit_length() const {
+        for (int i = static_cast<int>(w.size()) - 1; i >= 0; --i)
+            if (w[i] != 0)
+                return i * 32 + (32 - std::countl_zero(w[i]));
+        return 0;
+    }
+    constexpr void multiply_small(uint32_t m) {
+        uint64_t carry = 0;
+        for (uint32_t& word : w) {
+            const uint64_t x = static_cast<uint64_t>(word) * m + carry;
+            word = static_cast<uint32_t>(x);
+            carry = x >> 32;
+        }
+    }
+    constexpr void divide_small(uint32_t d) {
+        uint64_t rem = 0;
+        for (int i = static_cast<int>(w.size()) - 1; i >= 0; --i) {
+            const uint64_t x = (rem << 32) | w[i];
+            w[i] = static_cast<uint32_t>(x / d);
+            rem = x % d;
+        }
+    }
+    constexpr uint32_t bit(int i) const { return (w[i / 32] >> (i % 32)) & 1u; }
+    // The 128 bits from bit position `from` upwards (bits below 0 read as zero).
+    constexpr void top128(int from, uint64_t& hi, uint64_t& lo) const {
+        hi = lo = 0;
+        for (int i = 127; i >= 0; --i) {
+            const int src = from + i;
+            const uint64_t b = (src >= 0 && src < static_cast<int>(w.size()) * 32) ? bit(src) : 0;
+            if (i >= 64)
+                hi |= b << (i - 64);
+            else
+                lo |= b << i;
+        }
+    }
+};
+
+constexpr std::array<Pow10, pow10_max - pow10_min + 1> make_pow10_table() {
+    std::array<Pow10, pow10_max - pow10_min + 1> table{};
+    // 10^k = 5^k * 2^k for k >= 0.
+    BigInt five_power;
+    five_power.w[0] = 1;
+    for (int k = 0; k <= pow10_max; ++k) {
+        const int shift = five_power.bit_length() - 128;
+        Pow10& p = table[k - pow10_min];
+        five_power.top128(shift, p.hi, p.lo);
+        p.exp2 = k + shift;
+        five_power.multiply_small(5);
+    }
+    // 10^-j = 2^-j / 5^j, from floor(2^1020 / 5^j); flooring again by 5 keeps it exact.
+    BigInt quotient;
+    quotient.w[1020 / 32] = 1u << (1020 % 32);
+    for (int j = 1; j <= -pow10_min; ++j) {
+        quotient.divide_small(5);
+        const int shift = quotient.bit_length() - 128;
+        Pow10& p = table[-j - pow10_min];
+        quotient.top128(shift, p.hi, p.lo);
+        p.exp2 = shift - 1020 - j;
+    }
+    return table;
+}
+
+constexpr auto pow10_table = make_pow10_table();
+
+constexpr char digit_pairs[201] =
+    "00010203040506070809101112131415161718192021222324252627282930313233343536373839"
+    "40414243444546474849505152535455565758596061626364656667686970717273747576777879"
+    "8081828384858687888990919293949596979899";
+
+constexpr uint64_t ten14 = 100000000000000ULL;
+constexpr uint64_t ten15 = 1000000000000000ULL;
+
+// A positive number rounded to 15 significant digits: value = digits * 10^(exp10 - 14),
+// 10^14 <= digits < 10^15.
+struct Decimal15 {
+    uint64_t digits;
+    int exp10;
+};
+
+// The exact path for the few values the fast path cannot decide (a 15-digit rounding that
+// lies within the table's error of a half): the C library's correctly rounded conversion.
+Decimal15 round15_exact(double a) {
+    char buf[64];
+    std::snprintf(buf, sizeof buf, "%.14e", a);
+    Decimal15 d{0, 0};
+    const char* s = buf;
+    // The point may be a locale's character: take the digits, skip everything else.
+    for (; *s != '\0' && *s != 'e'; ++s)
+        if (*s >= '0' && *s <= '9')
+            d.digits = d.digits * 10 + static_cast<uint64_t>(*s - '0');
+    if (*s == 'e') {
+        ++s;
+        const bool negative = *s == '-';
+        if (*s == '-' || *s == '+')
+            ++s;
+        for (; *s >= '0' && *s <= '9'; ++s)
+            d.exp10 = d.exp10 * 10 + (*s - '0');
+        if (negative)
+            d.exp10 = -d.exp10;
+    }
+    return d;
+}
+
+// Compares the 192-bit number top:middle:low with half:0:0.
+inline int compare192(uint64_t top, uint64_t middle, uint64_t low, uint64_t half) {
+    if (top != half)
+        return top > half ? 1 : -1;
+    return (middle | low) != 0 ? 1 : 0;
+}
+
+// Correctly rounds a positive finite double to 15 significant digits (an exact half to even).
+//
+// With a = M * 2^p (M normalised to 64 bits) and e = floor(log10 2^(p+63)), a * 10^(14-e) lies in
+// [10^14, 2 * 10^15). The 192-bit product of M and the 128-bit power of ten is that value in
+// fixed point with at least 140 fraction bits, too small by less than M units of its last bit
+// (nothing when the power is exact). Dividing by 10 when the integer part has 16 digits and
+// comparing the rest with a half decides the rounding, except within those few units of a
+// half, where the exact path takes over.
+inline Decimal15 round15(double a) {
+    const uint64_t bits = std::bit_cast<uint64_t>(a);
+    uint64_t m = bits & ((uint64_t{1} << 52) - 1);
+    const int biased = static_cast<int>(bits >> 52);
+    int p;
+    if (biased != 0) {
+        m |= uint64_t{1} << 52;
+        p = biased - 1075;
+    } else {
+        p = -1074;
+    }
+    const int norm = std::countl_zero(m);
+    const uint64_t M = m << norm;
+    p -= norm;
+    int e = ((p + 63) * 78913) >> 18;  // floor((p + 63) * log10 2), exact over the double range
+    const int k = 14 - e;
+    const Pow10& t = pow10_table[k - pow10_min];
+
+    const u128 low_product = static_cast<u128>(M) * t.lo;
+    const u128 mid = static_cast<u128>(M) * t.hi + static_cast<uint64_t>(low_product >> 64);
+    const uint64_t low = static_cast<uint64_t>(low_product);
+    const uint64_t top = static_cast<uint64_t>(mid >> 64);
+    const uint64_t middle = static_cast<uint64_t>(mid);
+    const int g = -(p + t.exp2) - 128;  // fraction bits within `top`, about 12 to 18
+
+    const uint64_t whole = top >> g;
+    const bool sixteen = whole >= ten15;
+    const uint64_t divisor = sixteen ? 10 : 1;
+    uint64_t n = sixteen ? whole / 10 : whole;
+    const uint64_t rest = ((whole - n * divisor) << g) | (top & ((uint64_t{1} << g) - 1));
+    const uint64_t half = divisor << (g - 1);
+    e += sixteen;
+
+    // Away from the half (all but about one value in 2^11) the top word decides; no branch,
+    // since for measured data the direction is a coin toss.
+    bool up = rest > half;
+    if (rest - (half - 1) <= 1) [[unlikely]] {
+        // Within one unit of `top` of the half: look at all 192 bits.
+        const int vs_half = compare192(rest, middle, low, half);
+        if (k >= 0 && k <= exact_pow10_max) {
+            up = vs_half > 0 || (vs_half == 0 && (n & 1) != 0);
+        } else if (vs_half >= 0) {
+            up = true;  // the true product is above the computed one
+        } else {
+            // The true product is below the computed one plus M: round down if that stays
+            // below the half, otherwise it is too close to call here.
+            const uint64_t low2 = low + M;
+            const uint64_t carry1 = low2 < low;
+            const uint64_t middle2 = middle + carry1;
+            const uint64_t carry2 = carry1 != 0 && middle2 == 0;
+            if (compare192(rest + carry2, middle2, low2, half) > 0)
+                return round15_exact(a);
+            up = false;
+        }
+    }
+    n += up;
+    if (n == ten15) {
+        n = ten14;
+        ++e;
+    }
+    return {n, e};
+}
+
+// The 15 digits of 10^14 <= n < 10^15 into out[0..15).
+inline void write_15_digits(uint64_t n, char* out) {
+    const uint32_t high = static_cast<uint32_t>(n / 100000000);  // 7 digits
+    const uint32_t low = static_cast<uint32_t>(n - static_cast<uint64_t>(high) * 100000000);
+    out[0] = static_cast<char>('0' + high / 1000000);
+    const uint32_t h = high % 1000000;
+    std::memcpy(out + 1, digit_pairs + 2 * (h / 10000), 2);
+    std::memcpy(out + 3, digit_pairs + 2 * (h / 100 % 100), 2);
+    std::memcpy(out + 5, digit_pairs + 2 * (h % 100), 2);
+    const uint32_t l1 = low / 10000;
+    const uint32_t l2 = low % 10000;
+    std::memcpy(out + 7, digit_pairs + 2 * (l1 / 100), 2);
+    std::memcpy(out + 9, digit_pairs + 2 * (l1 % 100), 2);
+    std::memcpy(out + 11, digit_pairs + 2 * (l2 / 100), 2);
+    std::memcpy(out + 13, digit_pairs + 2 * (l2 % 100), 2);
+}
+
+bool is_digit(char c) {
+    return c >= '0' && c <= '9';
+}
+bool is_blank(char c) {
+    return c == ' ' || c == '\t' || c == '\n' || c == '\r';
+}
+
+// The extent of a number in text: [sign] digits [. digits] [E|D [sign] digits], with at least
+// one mantissa digit. The exponent belongs to the number only when it has a digit.
+struct NumberSpan {
+    size_t end = 0;            // one past the number; 0 when there is none
+    size_t mantissa_from = 0;  // first character after the sign
+    size_t exponent_at = 0;    // position of the E or D; 0 when there is no exponent
+    bool negative = false;
+    bool found = false;
+    // Decimal magnitude estimate for out-of-range results: positive for an overflow.
+    long long magnitude = 0;
+};
+
+NumberSpan scan_number(std::string_view s, size_t i) {
+    NumberSpan span;
+    if (i < s.size() && (s[i] == '+' || s[i] == '-')) {
+        span.negative = s[i] == '-';
+        ++i;
+    }
+    span.mantissa_from = i;
+    long long whole_digits = 0;   // significant digits before the point
+    long long leading_zeros = 0;  // zeros after the point before the first non-zero digit
+    bool any_digit = false;
+    bool nonzero_seen = false;
+    for (; i < s.size() && is_digit(s[i]); ++i) {
+        any_digit = true;
+        if (s[i] != '0')
+            nonzero_seen = true;
+        if (nonzero_seen && whole_digits < 1'000'000'000)
+            ++whole_digits;
+    }
+    if (i < s.size() && s[i] == '.') {
+        ++i;
+        for (; i < s.size() && is_digit(s[i]); ++i) {
+            any_digit = true;
+            if (s[i] != '0')
+                nonzero_seen = true;
+            if (!nonzero_seen && leading_zeros < 1'000'000'000)
+                ++leading_zeros;
+        }
+    }
+    if (!any_digit)
+        return span;
+    span.found = true;
+    span.end = i;
+    long long exponent = 0;
+    if (i < s.size() && (s[i] == 'E' || s[i] == 'e' || s[i] == 'D' || s[i] == 'd')) {
+        size_t j = i + 1;
+        bool exp_negative = false;
+        if (j < s.size() && (s[j] == '+' || s[j] == '-')) {
+            exp_negative = s[j] == '-';
+            ++j;
+        }
+        if (j < s.size() && is_digit(s[j])) {
+            span.exponent_at = i;
+            for (; j < s.size() && is_digit(s[j]); ++j)
+                if (exponent < 1'000'000'000)
+                    exponent = exponent * 10 + (s[j] - '0');
+            if (exp_negative)
+                exponent = -exponent;
+            span.end = j;
+        }
+    }
+    span.magnitude = (whole_digits > 0 ? whole_digits : -leading_zeros) + exponent;
+    return span;
+}
+
+// The value of a scanned number. Beyond the double range it saturates: the largest finite
+// magnitude for an overflow, zero for an underflow.
+double convert(std::string_view s, const NumberSpan& span, bool* overflow = nullptr) {
+    const char* first = s.data() + span.mantissa_from;
+    const char* last = s.data() + span.end;
+    std::string copy;
+    if (span.exponent_at != 0 && (s[span.exponent_at] == 'D' || s[span.exponent_at] == 'd')) {
+        copy.assign(first, last);
+        copy[span.exponent_at - span.mantissa_from] = 'e';
+        first = copy.data();
+        last = copy.data() + copy.size();
+    }
+    double value = 0.0;
+    const auto result = std::from_chars(first, last, value, std::chars_format::general);
+    if (result.ec == std::errc::result_out_of_range) {
+        value = span.magnitude > 0 ? DBL_MAX : 0.0;
+        if (overflow != nullptr)
+            *overflow = span.magnitude > 0;
+    } else if (result.ec != std::errc{})
+        value = 0.0;
+    return span.negative ? -value : value;
+}
+
+std::optional<double> round_to_fit(double value, double low, double high) {
+    if (std::isnan(value))
+        return std::nullopt;
+    double r = std::floor(value);
+    const double fraction = value - r;  // exact: value and its floor share the binade's grid
+    if (fraction > 0.5 || (fraction == 0.5 && std::fmod(r, 2.0) != 0.0))
+        r += 1.0;
+    if (!(r >= low && r <= high))
+        return std::nullopt;
+    return r;
+}
+
+}  // namespace
+
+int format_to(char* buffer, double value) {
+    const uint64_t bits = std::bit_cast<uint64_t>(value);
+    const bool negative = (bits >> 63) != 0;
+    const double a = std::fabs(value);
+    char* out = buffer;
+    if (!(a <= DBL_MAX)) {
+        if (std::isnan(value)) {
+            std::memcpy(out, "NaN", 3);
+            return 3;
+        }
+        std::memcpy(out, negative ? "-Inf" : " Inf", 4);
+        return 4;
+    }
+    if (a == 0.0) {
+        std::memcpy(out, " 0", 2);
+        return 2;
+    }
+    *out++ = negative ? '-' : ' ';
+
+    const Decimal15 d = round15(a);
+    char digits[32];
+    write_15_digits(d.digits, digits);
+    std::memset(digits + 15, '0', sizeof digits - 15);
+    int n = 15;
+    while (digits[n - 1] == '0')
+        --n;  // digits[0] is never '0'
+    const int e = d.exp10;
+
+    // The copies below move 16 characters at a time and trust the count afterwards; the
+    // largest reach is 32 characters from the buffer's start (sign, 14 digits, point, 16).
+    if (e >= 0 && e < 15) {
+        std::memcpy(out, digits, 16);
+        out += e + 1;
+        if (n > e + 1) {
+            *out++ = '.';
+            std::memcpy(out, digits + e + 1, 16);
+            out += n - e - 1;
+        }
+    } else if (e < 0 && e >= -4) {
+        std::memcpy(out, ".000", 4);
+        out += -e;
+        std::memcpy(out, digits, 16);
+        out += n;
+    } else {
+        *out++ = digits[0];
+        if (n > 1) {
+            *out++ = '.';
+            std::memcpy(out, digits + 1, 16);
+            out += n - 1;
+        }
+        *out++ = 'E';
+        int x = e;
+        *out++ = x < 0 ? '-' : '+';
+        if (x < 0)
+            x = -x;
+        if (x >= 100) {
+            *out++ = static_cast<char>('0' + x / 100);
+            x %= 100;
+        }
+        std::memcpy(out, digit_pairs + 2 * x, 2);
+        out += 2;
+    }
+    return static_cast<int>(out - buffer);
+}
+
+std::string str(double value) {
+    char buffer[32];
+    return std::string(buffer, static_cast<size_t>(format_to(buffer, value)));
+}
+
+std::string text(double value) {
+    char buffer[32];
+    const int n = format_to(buffer, value);
+    return buffer[0] == ' ' ? std::string(buffer + 1, static_cast<size_t>(n - 1))
+                            : std::string(buffer, static_cast<size_t>(n));
+}
+
+double val(std::string_view text) {
+    size_t i = 0;
+    while (i < text.size() && is_blank(text[i]))
+        ++i;
+    const NumberSpan span = scan_number(text, i);
+    return span.found ? convert(text, span) : 0.0;
+}
+
+std::optional<double> to_number(std::string_view text) {
+    size_t i = 0;
+    while (i < text.size() && is_blank(text[i]))
+        ++i;
+    const NumberSpan span = scan_number(text, i);
+    if (!span.found)
+        return std::nullopt;
+    size_t j = span.end;
+    while (j < text.size() && is_blank(text[j]))
+        ++j;
+    if (j != text.size())
+        return std::nullopt;
+    // Beyond the largest double is not a number the panel can hold; below the smallest is 0.
+    bool overflow = false;
+    const double value = convert(text, span, &overflow);
+    if (overflow)
+        return std::nullopt;
+    return value;
+}
+
+std::optional<int16_t> to_int16(double value) {
+    const auto r = round_to_fit(value, -32768.0, 32767.0);
+    if (!r)
+        return std::nullopt;
+    return static_cast<int16_t>(*r);
+}
+
+std::optional<int32_t> to_int32(double value) {
+    const auto r = round_to_fit(value, -2147483648.0, 2147483647.0);
+    if (!r)
+        return std::nullopt;
+    return static_cast<int32_t>(*r);
+}
+
+}  // namespace numtext
