@@ -1,5 +1,6 @@
 #include "pages/MeasFrm.h"
 
+#include <algorithm>
 #include <optional>
 
 #include "core/dialogs.h"
@@ -155,6 +156,9 @@ void MeasFrm::Form_Resize() {
     auto place = [this](QRadioButton* option, double top) {
         twips::set_top(option, top);
         size_option_button(*this, option);
+        // The fixed allowance for the indicator is narrower than this style's indicator and gap;
+        // never cut the caption short.
+        option->resize(std::max(option->width(), option->sizeHint().width()), option->height());
     };
     const double meas_h = twips::height(MeasFrame);
     place(SingleBtn, meas_h / 3);

@@ -49,9 +49,11 @@ void VxiFrm::Form_Load() {
     const bool first = LALbl.empty();
     while (LALbl.size() < rows) {
         const auto index = static_cast<int16_t>(LALbl.size());
-        // The address column keeps its designed width, which holds the widest head.
+        // The address column keeps its designed width: the head's caption, or a logical address
+        // (at most three digits) in a row, which must stay clear of the check box half a column on.
         LALbl.push_back(label("Label1"));
-        twips::set_width(LALbl.back(), TextWidth(QStringLiteral("Address")) + 100);
+        twips::set_width(LALbl.back(), index == 0 ? TextWidth(QStringLiteral("Address")) + 100
+                                                  : TextWidth(QStringLiteral("888")));
         auto* use = new QCheckBox(QStringLiteral("Check1"), this);
         use->hide();
         connect(use, &QCheckBox::clicked, this, [this, index] { UseCkbx_Click(index); });
