@@ -1,6 +1,8 @@
 // Measurement control: start, multi-mainframe arming, trigger, block poll and read, reset.
 #include "call.h"
+#include "measure.h"
 #include "ost7720.h"
+#include "signals.h"
 
 using namespace sim;
 
@@ -54,6 +56,8 @@ int32_t arm_step(Api& api, Session& s, ArmStep from, ArmStep to) {
         return api.refuse(err_measurement_state,
                           std::string("must follow ") + step_name(from) + ", not " + step_name(m.arm));
     m.arm = to;
+    if (to == ArmStep::master_finished)
+        start_running(m, now_seconds());
     return api.done();
 }
 
@@ -69,14 +73,7 @@ int32_t OST7720_CALL ost7720_initMeasure(int32_t session, int32_t channel) {
     std::vector<Channel*> chans;
     if (!s || !api.targets(*s, channel, k_any, chans))
         return api.status();
-    Measurement& m = s->measurement;
-    m = Measurement{};
-    m.started = true;
-    m.channels = member_ids(*s, channel);
-    for (Channel* c : chans) {
-        if (c->measure.arm_mode == code::arm_multi)
-            m.multi_mainframe = true;
-    }
+    start_measurement(*s, member_ids(*s, channel), now_seconds());
     return api.done();
 }
 
@@ -129,25 +126,40 @@ int32_t OST7720_CALL ost7720_triggerMeasure(int32_t session, int32_t channel, in
     std::vector<Channel*> chans;
     if (!s || !api.targets(*s, channel, k_any, chans))
         return api.status();
-    if (!s->measurement.started)
+    Measurement& m = s->measurement;
+    if (!m.started)
         return api.refuse(err_measurement_state, "no measurement is running");
+    double now = now_seconds();
+    advance(*s, now);  // triggers that came before this one keep their place
+    m.manual_pending = true;
+    m.manual_time = now;
     return api.done();
 }
 
+// The number of complete blocks every measuring channel addressed has still to read; status 1
+// (a warning) when one of them lost blocks it had not read.
 int32_t OST7720_CALL ost7720_blockAvailable(int32_t session, int32_t channel, int32_t* available) {
     Api api("ost7720_blockAvailable", session, {trace_int(session), trace_int(channel)});
     if (api.injected())
         return api.status();
+    Session* s = api.session(session);
     std::vector<Channel*> chans;
-    if (!api.resolve(session, channel, k_any, chans, true))
+    if (!s || !api.targets(*s, channel, k_any, chans))
         return api.status();
     if (!api.not_null(available, "available"))
         return api.status();
-    *available = 0;
+    advance(*s, now_seconds());
+    bool overrun = false;
+    int64_t n = available_blocks(*s, member_ids(*s, channel), overrun);
+    *available = static_cast<int32_t>(std::min<int64_t>(n, INT32_MAX));
     api.out(*available);
-    return api.done();
+    return api.done(overrun ? warn_overrun : ok);
 }
 
+// Reads the channel's next block: time data (345, block size values, volts) or frequency data
+// (346, block size / 2 magnitudes of the Hann-windowed block). Fewer values than the block holds
+// may be asked for; the wait argument (0 or 1) is accepted, and a block that is not complete is
+// refused either way.
 int32_t OST7720_CALL ost7720_readFloat64Data(int32_t session, int32_t channel, int32_t data_type,
                                              double* data, int32_t count, int32_t* actual, int32_t wait) {
     Api api(
@@ -156,15 +168,48 @@ int32_t OST7720_CALL ost7720_readFloat64Data(int32_t session, int32_t channel, i
     if (api.injected())
         return api.status();
     Session* s = api.session(session);
-    if (!s || !single_channel(api, *s, channel, k_input, "channel"))
+    if (!s)
+        return api.status();
+    Channel* ch = single_channel(api, *s, channel, k_input, "channel");
+    if (!ch)
         return api.status();
     if (data_type != code::read_time && data_type != code::read_frequency)
         return api.refuse(err_invalid_code, "data type code " + std::to_string(data_type) + " unknown");
+    if (wait != 0 && wait != 1)
+        return api.refuse(err_invalid_code, "wait code " + std::to_string(wait) + " unknown");
     if (count < 0)
         return api.refuse(err_invalid_count, "count " + std::to_string(count) + " below 0");
     if ((count > 0 && !api.not_null(data, "data")) || !api.not_null(actual, "actual"))
         return api.status();
-    return api.refuse(err_no_data, "no block of channel " + std::to_string(channel) + " is available");
+    Measurement& m = s->measurement;
+    const double now = now_seconds();
+    advance(*s, now);
+    if (!m.cursor.count(channel))
+        return api.refuse(err_no_data, "channel " + std::to_string(channel) + " is not measuring");
+    bool overrun = false;
+    if (available_blocks(*s, {channel}, overrun) < 1)
+        return api.refuse(err_no_data, "no block of channel " + std::to_string(channel) + " is available");
+    const bool time = data_type == code::read_time;
+    if ((time ? ch->measure.enable_time : ch->measure.enable_frequency) != code::enable_on)
+        return api.refuse(err_data_not_enabled, std::string(time ? "time" : "frequency") +
+                                                    " data of channel " + std::to_string(channel) +
+                                                    " is not enabled");
+    const int32_t values = time ? m.blocksize : m.blocksize / 2;
+    if (count > values)
+        return api.refuse(err_invalid_count, "count " + std::to_string(count) + " above the " +
+                                                 std::to_string(values) + " values of the block");
+    std::vector<double> block;
+    take_block(*s, channel, now, block);
+    if (!time) {
+        std::vector<double> spectrum(block.size() / 2);
+        signals::magnitude_spectrum(block, spectrum);
+        block.swap(spectrum);
+    }
+    std::copy(block.begin(), block.begin() + count, data);
+    *actual = count;
+    api.out_array(data, count);
+    api.out(count);
+    return api.done();
 }
 
 int32_t OST7720_CALL ost7720_resetMeasure(int32_t session, int32_t channel) {

@@ -197,9 +197,22 @@ int32_t OST7720_CALL ost7720_setAutoTrigger(int32_t session, int32_t channel, in
 
 // Channel settings shared by inputs and sources
 
+// A channel switched on notes the time, from which a source's ramp runs.
 int32_t OST7720_CALL ost7720_setActive(int32_t session, int32_t channel, int32_t state_code) {
-    return set_code("ost7720_setActive", session, channel, state_code, k_any, {code::on, code::off}, "active",
-                    [](Channel& c) -> int32_t& { return c.active; });
+    Api api("ost7720_setActive", session, {trace_int(session), trace_int(channel), trace_int(state_code)});
+    if (api.injected())
+        return api.status();
+    std::vector<Channel*> chans;
+    if (!api.resolve(session, channel, k_any, chans))
+        return api.status();
+    if (state_code != code::on && state_code != code::off)
+        return api.refuse(err_invalid_code, "active code " + std::to_string(state_code) + " unknown");
+    for (Channel* c : chans) {
+        if (state_code == code::on && c->active != code::on)
+            c->active_since = now_seconds();
+        c->active = state_code;
+    }
+    return api.done();
 }
 
 int32_t OST7720_CALL ost7720_getActive(int32_t session, int32_t channel, int32_t* state_code) {

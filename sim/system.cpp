@@ -1,6 +1,7 @@
 #include "system.h"
 
 #include <algorithm>
+#include <chrono>
 #include <cstdlib>
 
 #include "calllog.h"
@@ -12,9 +13,11 @@ namespace {
 
 System sys_;
 bool powered_ = false;
+std::chrono::steady_clock::time_point origin_ = std::chrono::steady_clock::now();
 
 void power_on(const std::vector<ModuleSpec>& specs, std::string config_error) {
     sys_ = System{};
+    origin_ = std::chrono::steady_clock::now();
     reset_call_log();
     open_trace_from_environment();
     sys_.config_error = std::move(config_error);
@@ -92,6 +95,60 @@ void reset_from_environment() {
     set_failures(failures);
 }
 
+double now_seconds() {
+    if (sys_.virtual_clock)
+        return sys_.virtual_now;
+    return std::chrono::duration<double>(std::chrono::steady_clock::now() - origin_).count();
+}
+
+void use_virtual_clock() {
+    System& sys = state();
+    if (sys.virtual_clock)
+        return;
+    sys.virtual_now = now_seconds();
+    sys.virtual_clock = true;
+}
+
+void advance_clock(double seconds) {
+    use_virtual_clock();
+    if (seconds > 0)
+        state().virtual_now += seconds;
+}
+
+double clock_seconds() {
+    state();
+    return now_seconds();
+}
+
+void set_input_samples(int32_t channel, const std::vector<double>& samples) {
+    System& sys = state();
+    if (samples.empty())
+        sys.input_samples.erase(channel);
+    else
+        sys.input_samples[channel] = samples;
+}
+
+void set_arb_ready_polls(int polls) {
+    state().arb_ready_polls = std::max(0, polls);
+}
+
+bool read_source(int32_t session, int32_t channel, SourceView& view) {
+    System& sys = state();
+    auto it = sys.sessions.find(session);
+    if (it == sys.sessions.end())
+        return false;
+    const ChannelRef* ref = find_channel(it->second, channel);
+    if (!ref || ref->kind != ChannelKind::source)
+        return false;
+    const Channel& c = channel_at(*ref);
+    const SourceSettings& s = c.source;
+    view =
+        SourceView{c.active,    c.trigger_channel, s.mode,        s.output,      s.sum,         s.cola,
+                   c.range,     s.ramp_rate,       s.sine_freq,   s.sine_phase,  s.seed,        s.duty_cycle,
+                   s.amp_scale, s.blocksize,       s.buffer_size, s.buffer_mode, s.buffer_init, s.arb_table};
+    return true;
+}
+
 Channel power_on_channel(ChannelKind kind, bool primary_source) {
     Channel ch;
     ch.kind = kind;
@@ -107,6 +164,7 @@ void preset_channel(Channel& ch) {
     int module = ch.module;
     ch = power_on_channel(ch.kind, ch.primary_source);
     ch.module = module;
+    ch.active_since = now_seconds();
 }
 
 int32_t largest_blocksize_for(const ModuleSpec& spec) {

@@ -26,7 +26,9 @@
 #pragma once
 
 #include <cstdint>
+#include <deque>
 #include <map>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -119,6 +121,7 @@ struct Channel {
     int32_t active = code::on;
     double range = 2.0;
     int32_t trigger_channel = code::off;
+    double active_since = 0;  // clock time the channel last became active
     MeasureSettings measure;
     InputSettings input;
     SourceSettings source;
@@ -142,12 +145,36 @@ struct ChannelRef {
 
 enum class ArmStep { none, master_setup, armed, slave_finished, master_finished };
 
-// The session's measurement; the channels it runs on and how far arming has gone.
+// The session's measurement. Samples are counted from sample 0 at clock time t0 (the start, or
+// the end of multi-mainframe arming); block starts are sample indexes.
 struct Measurement {
-    bool started = false;
+    bool started = false;          // ost7720_initMeasure was called
     bool multi_mainframe = false;  // a channel had arm mode 430 at the start
     ArmStep arm = ArmStep::none;
-    std::vector<int32_t> channels;
+    bool running = false;           // taking data (at once, or after the last arming step)
+    std::vector<int32_t> channels;  // ids the measurement was started on
+    std::vector<int32_t> inputs;    // active inputs among them: the channels that deliver data
+    // Latched from the first input (or first channel) at the start.
+    double t0 = 0;
+    double sample_rate = 2.56 * max_span;
+    int32_t blocksize = 1024;
+    bool continuous = false;
+    bool auto_trigger = true;
+    size_t capacity = 2;  // blocks the module memory keeps
+    // Trigger search.
+    bool searching = true;                  // block mode: false while the last block waits to be read
+    int64_t search_from = 0;                // first sample the next trigger may fall on
+    int64_t scanned_to = 0;                 // input triggers have looked at samples before this
+    std::map<int32_t, bool> trigger_armed;  // per input trigger channel: hysteresis state
+    bool manual_pending = false;            // ost7720_triggerMeasure waits to be used
+    double manual_time = 0;
+    std::optional<int64_t> pending;          // trigger found, block still filling
+    std::optional<int64_t> continuous_from;  // continuous mode: start of the first block
+    // Completed blocks: the kept ones, numbered first_number.., and each input's next block.
+    std::deque<int64_t> starts;
+    int64_t first_number = 0;
+    int64_t completed = 0;
+    std::map<int32_t, int64_t> cursor;
 };
 
 struct Session {
@@ -168,7 +195,13 @@ struct System {
     int32_t next_group = first_group_id;
     std::string details;  // last error of any call, and of calls made without a session
     int arb_ready_polls = default_arb_ready_polls;
+    bool virtual_clock = false;
+    double virtual_now = 0;
+    std::map<int32_t, std::vector<double>> input_samples;  // exact samples by channel id
 };
+
+// Seconds since power-on, on the real or the virtual clock.
+double now_seconds();
 
 // The one system, powered on from the environment before first use unless a test reset it.
 System& state();
