@@ -1,6 +1,8 @@
 // Start-up: discovery, the session over the modules in use, and the fatal start-up messages.
 #include <gtest/gtest.h>
 
+#include <QFontMetrics>
+
 #include "core/GreetFrm.h"
 #include "core/global.h"
 #include "core/startup.h"
@@ -231,6 +233,21 @@ TEST_F(StartupTest, FailingInitStageShowsTheDriversTextAndEnds) {
             testing::ExitedWithCode(0), "^EXACT-MESSAGE$")
             << stage;
     }
+}
+
+}  // namespace
+
+namespace {
+
+TEST_F(StartupTest, SplashTextFitsItsBoxAndIsCentred) {
+    GreetFrm& splash = forms::get<GreetFrm>();
+    splash.resize(853, 683);
+    splash.show();
+    splash.run_resize();
+    const QLineEdit* box = splash.Text1;
+    EXPECT_GE(box->width(), QFontMetrics(box->font()).horizontalAdvance(box->text()));
+    EXPECT_NEAR(box->x() + box->width() / 2.0, splash.width() / 2.0, 5.0);
+    EXPECT_EQ(box->y(), splash.height() / 2);
 }
 
 }  // namespace
