@@ -1,0 +1,86 @@
+#include "display/output_files.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+#include "core/dialogs.h"
+#include "core/global.h"
+#include "core/number_text.h"
+
+namespace {
+
+// The longest line: quote, 22 characters of number text, quote, CR LF.
+constexpr size_t longest_line = 26;
+// format_to may use 32 characters from where the number starts.
+constexpr size_t format_scratch = 32;
+
+// The bytes of one block: lines 0..lines-1, line k holding sample k. A sample the array does
+// not hold (an array shorter than the block) is written as 0 rather than read from beyond it.
+// The buffer is kept from block to block so that a run does not allocate for every file.
+size_t build_block(const std::vector<double>& samples, size_t lines, std::vector<char>& buffer) {
+    const size_t needed = lines * longest_line + format_scratch;
+    if (buffer.size() < needed)
+        buffer.resize(needed);
+    char* const start = buffer.data();
+    char* out = start;
+    const size_t held = std::min(lines, samples.size());
+    const double* sample = samples.data();
+    for (size_t k = 0; k < held; ++k) {
+        *out = '"';
+        out += 1 + numtext::format_to(out + 1, sample[k]);
+        std::memcpy(out, "\"\r\n", 3);
+        out += 3;
+    }
+    for (size_t k = held; k < lines; ++k) {
+        std::memcpy(out, "\" 0\"\r\n", 6);
+        out += 6;
+    }
+    return static_cast<size_t>(out - start);
+}
+
+// Writes one block to the file: truncating it first, or at its end. On any failure the file
+// is closed and, if it is a regular file, cut back to the length it had before this block, so
+// that a full disk in the middle of an append never leaves a file that seems to hold a block it
+// holds only part of (a rewritten file is left empty).
+bool write_block(const std::string& name, bool append, const char* bytes, size_t size) {
+    std::FILE* file = std::fopen(name.c_str(), append ? "ab" : "wb");
+    if (file == nullptr)
+        return false;
+    std::setvbuf(file, nullptr, _IONBF, 0);  // one direct write; errors show at fwrite
+    long before = 0;
+    if (append && (std::fseek(file, 0, SEEK_END) != 0 || (before = std::ftell(file)) < 0))
+        before = -1;
+    bool ok = std::fwrite(bytes, 1, size, file) == size;
+    ok = std::fflush(file) == 0 && ok;
+    ok = std::fclose(file) == 0 && ok;
+    if (!ok && before >= 0) {
+        std::error_code ec;
+        if (std::filesystem::is_regular_file(name, ec))
+            std::filesystem::resize_file(name, static_cast<std::uintmax_t>(before), ec);
+    }
+    return ok;
+}
+
+}  // namespace
+
+void write_trace_files(int16_t& append) {
+    static std::vector<char> buffer;
+    const bool appending = append == global::flag_true;
+    // The block has num_points + 1 lines. The count is wide: a 16-bit counter would stop
+    // blocks above 32767 points from being written at all.
+    const size_t lines = global::num_points < 0 ? 0 : static_cast<size_t>(global::num_points) + 1;
+    for (int t = 0; t <= 3; ++t) {
+        const std::string& name = global::trace_file[t];
+        if (global::trace_channel[t] <= 0 || name.empty())
+            continue;
+        const size_t size = build_block(global::trace_data(t), lines, buffer);
+        if (!write_block(name, appending, buffer.data(), size)) {
+            dialogs::notice("Couldn't create " + name + ".  No output file was created");
+            return;
+        }
+    }
+}
