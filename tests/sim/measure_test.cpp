@@ -2,9 +2,11 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cmath>
 #include <numeric>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "errors.h"
@@ -129,6 +131,20 @@ TEST(SimMeasure, ContinuousBlocksJoinWithoutAGapAndBlockModeWaitsForTheRead) {
     EXPECT_EQ(m.available(), 1);
 }
 
+TEST(SimMeasure, RunsOnRealTimeByDefault) {
+    sim::reset();
+    int32_t s = simtest::open_both();
+    ASSERT_EQ(ost7720_initMeasure(s, 1), 0);
+    int32_t a = 0;
+    auto until = std::chrono::steady_clock::now() + std::chrono::seconds(2);
+    while (a == 0 && std::chrono::steady_clock::now() < until) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(5));
+        ASSERT_EQ(ost7720_blockAvailable(s, 1, &a), 0);
+    }
+    EXPECT_EQ(a, 1);
+    EXPECT_GE(sim::clock_seconds(), 0.02);
+}
+
 TEST(SimMeasure, ManualTriggerAndNeverTriggering) {
     Rig r;
     r.start(340, 440);
@@ -181,6 +197,22 @@ TEST(SimMeasure, InputLevelTriggerFiresOnItsSlope) {
         r.start(340, 440);
         // Arms on +1 (sample 300), fires on the -1 at sample 1000.
         sim::advance_clock((1000 + 1024 - 0.5) / fs);
+        EXPECT_EQ(r.available(), 0);
+        sim::advance_clock(1.0 / fs);
+        EXPECT_EQ(r.available(), 1);
+    }
+    {
+        // Bound mode, Pos/Exit: inside the band 0 .. 0.5 V arms, leaving it fires (sample 100).
+        Rig r;
+        std::vector<double> leave(400, 0.25);
+        std::fill(leave.begin() + 100, leave.end(), 1.0);
+        sim::set_input_samples(3, leave);
+        ASSERT_EQ(ost7720_setTriggerChannel(r.s, 3, 420), 0);
+        ASSERT_EQ(ost7720_setTriggerMode(r.s, 3, 415), 0);
+        ASSERT_EQ(ost7720_setTriggerLevel(r.s, 3, 416, 0.0), 0);
+        ASSERT_EQ(ost7720_setTriggerLevel(r.s, 3, 417, 25.0), 0);
+        r.start(340, 440);
+        sim::advance_clock((100 + 1024 - 0.5) / fs);
         EXPECT_EQ(r.available(), 0);
         sim::advance_clock(1.0 / fs);
         EXPECT_EQ(r.available(), 1);
