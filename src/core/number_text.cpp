@@ -8,6 +8,9 @@
 #include <cstdio>
 #include <cstring>
 
+static_assert(std::endian::native == std::endian::little,
+              "the digit text is built in little-endian registers");
+
 namespace numtext {
 
 namespace {
@@ -149,35 +152,42 @@ inline int compare192(uint64_t top, uint64_t middle, uint64_t low, uint64_t half
 // Correctly rounds a positive finite double to 15 significant digits (an exact half to even).
 //
 // With a = M * 2^p (M normalised to 64 bits) and e = floor(log10 2^(p+63)), a * 10^(14-e) lies in
-// [10^14, 2 * 10^15). The 192-bit product of M and the 128-bit power of ten is that value in
-// fixed point with at least 140 fraction bits, too small by less than M units of its last bit
-// (nothing when the power is exact). Dividing by 10 when the integer part has 16 digits and
-// comparing the rest with a half decides the rounding, except within those few units of a
-// half, where the exact path takes over.
-inline Decimal15 round15(double a) {
+// [10^14, 2 * 10^15). The product of M and the 128-bit power of ten is that value in fixed point
+// with at least 140 fraction bits (12 to 18 of them in the top word), too small by less than M
+// units of its last bit, or exact when the power is. Dividing by 10 when the integer part has 16
+// digits and comparing the rest with a half decides the rounding. The first pass multiplies by
+// the power's high word only, which is short by less than one unit of the top word: that
+// decides all but about one value in 2^11, those within a unit of the half. They take the full
+// 192-bit product, and the few that even that cannot decide take the exact path.
+template <bool full_product>
+Decimal15 round15(double a) {
     const uint64_t bits = std::bit_cast<uint64_t>(a);
-    uint64_t m = bits & ((uint64_t{1} << 52) - 1);
+    const uint64_t m = bits & ((uint64_t{1} << 52) - 1);
     const int biased = static_cast<int>(bits >> 52);
+    uint64_t M;
     int p;
-    if (biased != 0) {
-        m |= uint64_t{1} << 52;
-        p = biased - 1075;
+    if (biased != 0) [[likely]] {
+        M = (m | (uint64_t{1} << 52)) << 11;
+        p = biased - 1075 - 11;
     } else {
-        p = -1074;
+        const int norm = std::countl_zero(m);
+        M = m << norm;
+        p = -1074 - norm;
     }
-    const int norm = std::countl_zero(m);
-    const uint64_t M = m << norm;
-    p -= norm;
     int e = ((p + 63) * 78913) >> 18;  // floor((p + 63) * log10 2), exact over the double range
     const int k = 14 - e;
     const Pow10& t = pow10_table[k - pow10_min];
 
-    const u128 low_product = static_cast<u128>(M) * t.lo;
-    const u128 mid = static_cast<u128>(M) * t.hi + static_cast<uint64_t>(low_product >> 64);
-    const uint64_t low = static_cast<uint64_t>(low_product);
-    const uint64_t top = static_cast<uint64_t>(mid >> 64);
-    const uint64_t middle = static_cast<uint64_t>(mid);
-    const int g = -(p + t.exp2) - 128;  // fraction bits within `top`, about 12 to 18
+    u128 product = static_cast<u128>(M) * t.hi;
+    uint64_t low = 0;
+    if constexpr (full_product) {
+        const u128 low_product = static_cast<u128>(M) * t.lo;
+        product += static_cast<uint64_t>(low_product >> 64);
+        low = static_cast<uint64_t>(low_product);
+    }
+    const uint64_t top = static_cast<uint64_t>(product >> 64);
+    const uint64_t middle = static_cast<uint64_t>(product);
+    const int g = -(p + t.exp2) - 128;  // fraction bits within `top`
 
     const uint64_t whole = top >> g;
     const bool sixteen = whole >= ten15;
@@ -187,26 +197,29 @@ inline Decimal15 round15(double a) {
     const uint64_t half = divisor << (g - 1);
     e += sixteen;
 
-    // Away from the half (all but about one value in 2^11) the top word decides; no branch,
-    // since for measured data the direction is a coin toss.
+    // Away from the half the top word decides, without a branch: for measured data the
+    // direction is a coin toss.
     bool up = rest > half;
     if (rest - (half - 1) <= 1) [[unlikely]] {
-        // Within one unit of `top` of the half: look at all 192 bits.
-        const int vs_half = compare192(rest, middle, low, half);
-        if (k >= 0 && k <= exact_pow10_max) {
-            up = vs_half > 0 || (vs_half == 0 && (n & 1) != 0);
-        } else if (vs_half >= 0) {
-            up = true;  // the true product is above the computed one
+        if constexpr (!full_product) {
+            return round15<true>(a);
         } else {
-            // The true product is below the computed one plus M: round down if that stays
-            // below the half, otherwise it is too close to call here.
-            const uint64_t low2 = low + M;
-            const uint64_t carry1 = low2 < low;
-            const uint64_t middle2 = middle + carry1;
-            const uint64_t carry2 = carry1 != 0 && middle2 == 0;
-            if (compare192(rest + carry2, middle2, low2, half) > 0)
-                return round15_exact(a);
-            up = false;
+            const int vs_half = compare192(rest, middle, low, half);
+            if (k >= 0 && k <= exact_pow10_max) {
+                up = vs_half > 0 || (vs_half == 0 && (n & 1) != 0);
+            } else if (vs_half >= 0) {
+                up = true;  // the true product is above the computed one
+            } else {
+                // The true product is below the computed one plus M: round down if that stays
+                // below the half, otherwise it is too close to call here.
+                const uint64_t low2 = low + M;
+                const uint64_t carry1 = low2 < low;
+                const uint64_t middle2 = middle + carry1;
+                const uint64_t carry2 = carry1 != 0 && middle2 == 0;
+                if (compare192(rest + carry2, middle2, low2, half) > 0)
+                    return round15_exact(a);
+                up = false;
+            }
         }
     }
     n += up;
@@ -217,21 +230,76 @@ inline Decimal15 round15(double a) {
     return {n, e};
 }
 
-// The 15 digits of 10^14 <= n < 10^15 into out[0..15).
-inline void write_15_digits(uint64_t n, char* out) {
-    const uint32_t high = static_cast<uint32_t>(n / 100000000);  // 7 digits
+// The digits of x < 10^8 as eight byte values 0..9, the first digit in the lowest byte: four
+// digits per 32-bit lane, then two per 16-bit lane, then one per byte, all in one register.
+inline uint64_t eight_digits(uint32_t x) {
+    uint64_t v = (x / 10000) | (static_cast<uint64_t>(x % 10000) << 32);
+    const uint64_t hundreds = ((v * 10486) >> 20) & 0x0000007F0000007FULL;  // lane / 100
+    v = hundreds | ((v - hundreds * 100) << 16);
+    const uint64_t tens = ((v * 103) >> 10) & 0x000F000F000F000FULL;  // lane / 10
+    return tens | ((v - tens * 10) << 8);
+}
+
+// The 15 digits of 10^14 <= n < 10^15 as characters, digit i in byte i of lo:hi (byte 15 a
+// spare '0'), and how many remain without the trailing zeros. The text is built in registers
+// and stored whole: storing digits piecemeal and copying them on would make the processor wait
+// for its store buffer.
+struct Digits {
+    uint64_t lo;
+    uint64_t hi;
+    int count;
+};
+
+inline Digits digits_of(uint64_t n) {
+    const uint32_t high = static_cast<uint32_t>(n / 100000000);  // 7 digits, so byte 0 is 0
     const uint32_t low = static_cast<uint32_t>(n - static_cast<uint64_t>(high) * 100000000);
-    out[0] = static_cast<char>('0' + high / 1000000);
-    const uint32_t h = high % 1000000;
-    std::memcpy(out + 1, digit_pairs + 2 * (h / 10000), 2);
-    std::memcpy(out + 3, digit_pairs + 2 * (h / 100 % 100), 2);
-    std::memcpy(out + 5, digit_pairs + 2 * (h % 100), 2);
-    const uint32_t l1 = low / 10000;
-    const uint32_t l2 = low % 10000;
-    std::memcpy(out + 7, digit_pairs + 2 * (l1 / 100), 2);
-    std::memcpy(out + 9, digit_pairs + 2 * (l1 % 100), 2);
-    std::memcpy(out + 11, digit_pairs + 2 * (l2 / 100), 2);
-    std::memcpy(out + 13, digit_pairs + 2 * (l2 % 100), 2);
+    const uint64_t a = eight_digits(high);
+    const uint64_t b = eight_digits(low);
+    const int trailing_zeros = b != 0 ? std::countl_zero(b) / 8 : 8 + std::countl_zero(a) / 8;
+    constexpr uint64_t zeros = 0x3030303030303030ULL;
+    return {((a >> 8) | (b << 56)) | zeros, (b >> 8) | zeros, 15 - trailing_zeros};
+}
+
+// Byte masks for a point before character `at` (1..15) of a 16-character text: the characters
+// before it, the point itself, and the characters after it (shifted one place on).
+struct PointMasks {
+    uint64_t keep[2];
+    uint64_t point[2];
+    uint64_t shifted[2];
+};
+
+constexpr std::array<PointMasks, 16> make_point_masks() {
+    std::array<PointMasks, 16> masks{};
+    for (int at = 1; at < 16; ++at) {
+        for (int byte = 0; byte < 16; ++byte) {
+            const uint64_t ones = uint64_t{0xFF} << (8 * (byte % 8));
+            if (byte < at)
+                masks[at].keep[byte / 8] |= ones;
+            if (byte == at)
+                masks[at].point[byte / 8] |= (ones / 0xFF) * '.';
+            if (byte > at)
+                masks[at].shifted[byte / 8] |= ones;
+        }
+    }
+    return masks;
+}
+
+constexpr auto point_masks = make_point_masks();
+
+// Stores the 16 characters with a point inserted before character `at`; the last one drops out.
+inline void store_with_point(char* out, const Digits& d, int at) {
+    const PointMasks& m = point_masks[at];
+    const uint64_t shifted_lo = d.lo << 8;
+    const uint64_t shifted_hi = (d.hi << 8) | (d.lo >> 56);
+    const uint64_t lo = (d.lo & m.keep[0]) | m.point[0] | (shifted_lo & m.shifted[0]);
+    const uint64_t hi = (d.hi & m.keep[1]) | m.point[1] | (shifted_hi & m.shifted[1]);
+    std::memcpy(out, &lo, 8);
+    std::memcpy(out + 8, &hi, 8);
+}
+
+inline void store_digits(char* out, const Digits& d) {
+    std::memcpy(out, &d.lo, 8);
+    std::memcpy(out + 8, &d.hi, 8);
 }
 
 bool is_digit(char c) {
@@ -363,37 +431,24 @@ int format_to(char* buffer, double value) {
     }
     *out++ = negative ? '-' : ' ';
 
-    const Decimal15 d = round15(a);
-    char digits[32];
-    write_15_digits(d.digits, digits);
-    std::memset(digits + 15, '0', sizeof digits - 15);
-    int n = 15;
-    while (digits[n - 1] == '0')
-        --n;  // digits[0] is never '0'
+    const Decimal15 d = round15<false>(a);
+    const Digits digits = digits_of(d.digits);
+    const int n = digits.count;
     const int e = d.exp10;
 
-    // The copies below move 16 characters at a time and trust the count afterwards; the
-    // largest reach is 32 characters from the buffer's start (sign, 14 digits, point, 16).
+    // Each case stores 16 characters at once and counts the ones that belong to the text; the
+    // farthest reach is 22 characters from the buffer's start.
     if (e >= 0 && e < 15) {
-        std::memcpy(out, digits, 16);
-        out += e + 1;
-        if (n > e + 1) {
-            *out++ = '.';
-            std::memcpy(out, digits + e + 1, 16);
-            out += n - e - 1;
-        }
+        store_with_point(out, digits, e + 1);
+        out += n > e + 1 ? n + 1 : e + 1;
     } else if (e < 0 && e >= -4) {
         std::memcpy(out, ".000", 4);
         out += -e;
-        std::memcpy(out, digits, 16);
+        store_digits(out, digits);
         out += n;
     } else {
-        *out++ = digits[0];
-        if (n > 1) {
-            *out++ = '.';
-            std::memcpy(out, digits + 1, 16);
-            out += n - 1;
-        }
+        store_with_point(out, digits, 1);
+        out += n > 1 ? n + 1 : 1;
         *out++ = 'E';
         int x = e;
         *out++ = x < 0 ? '-' : '+';
