@@ -31,15 +31,15 @@ Channel* single_channel(Api& api, Session& s, int32_t id, unsigned kinds, const 
 const char* step_name(ArmStep step) {
     switch (step) {
         case ArmStep::none:
-            return "ost7720_initMeasure";
+            return "initMeasure";
         case ArmStep::master_setup:
-            return "ost7720_armMeasureMasterSetup";
+            return "armMeasureMasterSetup";
         case ArmStep::armed:
-            return "ost7720_armMeasure";
+            return "armMeasure";
         case ArmStep::slave_finished:
-            return "ost7720_armMeasureSlaveFinish";
+            return "armMeasureSlaveFinish";
         case ArmStep::master_finished:
-            return "ost7720_armMeasureMasterFinish";
+            return "armMeasureMasterFinish";
     }
     return "";
 }

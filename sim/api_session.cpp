@@ -64,7 +64,9 @@ void fill_hw_record(const Module& m, int32_t* r) {
 }
 
 // Opens a session; stage 1 to 3 for the staged single-module calls (a later stage continues
-// the session the earlier stage opened on the same module), 3 for a resource list.
+// the session the earlier stage opened on the same module, so the three give one handle and one
+// close ends it), 3 for a resource list. A non-zero reset puts every channel of the modules
+// back to its power-on values; the identity query always passes. On failure the handle is 0.
 int32_t open_session(const char* fn, const char* resource, int16_t id_query, int16_t reset, int32_t* session,
                      int stage, bool list) {
     Api api(fn, 0, {trace_text(resource, max_resource_length), trace_int(id_query), trace_int(reset)});
@@ -137,6 +139,7 @@ int32_t open_session(const char* fn, const char* resource, int16_t id_query, int
 
 extern "C" {
 
+// Writes at most max_modules addresses, in address order; found is the number written.
 int32_t OST7720_CALL ost7720_find(int32_t reserved, int32_t* addresses, int32_t max_modules, int32_t* found,
                                   char* interface_name, int32_t timeout_s) {
     Api api("ost7720_find", 0, {trace_int(reserved), trace_int(max_modules), trace_int(timeout_s)});

@@ -23,6 +23,11 @@
 //     or above 20000 Hz, is refused.
 //   input range: the next of 0.1, 0.2, 0.5, 1, 2, 5, 10 V at or above the request (0 gives
 //     0.1 V); negative or above 10 V is refused. Source range: any peak amplitude 0 to 10 V.
+//   refused outside their limits: trigger levels -100..100 % of the range, averages and update
+//     1..32767, ramp rate 0..100 s, sine frequency 0..25600 Hz, phase -360..360 degrees, seed
+//     0..255, duty cycle 0..1, amplitude scale 0..1, source buffer size 1..8192; the source block
+//     size 1..8192 is coerced up to a power of two from 64.
+// The measurement and the signals are described in measure.h.
 #pragma once
 
 #include <cstdint>

@@ -374,8 +374,7 @@ TEST(SimMeasure, MultiMainframeArmingRunsOnlyInItsOrder) {
     EXPECT_EQ(details(r.s), "ost7720_armMeasureMasterSetup: no measurement: call ost7720_initMeasure first");
     r.start(340);
     EXPECT_EQ(ost7720_armMeasure(r.s, r.all, 0), sim::err_measurement_state);
-    EXPECT_EQ(details(r.s),
-              "ost7720_armMeasure: must follow ost7720_armMeasureMasterSetup, not ost7720_initMeasure");
+    EXPECT_EQ(details(r.s), "ost7720_armMeasure: must follow armMeasureMasterSetup, not initMeasure");
     ASSERT_EQ(ost7720_armMeasureMasterSetup(r.s, 16), 0);
     EXPECT_EQ(ost7720_armMeasureSlaveFinish(r.s, 1), sim::err_measurement_state);
     ASSERT_EQ(ost7720_armMeasure(r.s, r.all, 0), 0);
