@@ -293,6 +293,15 @@ TEST_F(OutputFilesTest, DiskFullPartWayCutsTheFileBackToItsEarlierBlocks) {
     EXPECT_EQ(fs::file_size(file), 0u);
 }
 
+std::vector<std::string> split_crlf_lines(const std::string& text) {
+    std::vector<std::string> lines;
+    size_t from = 0;
+    for (size_t crlf; (crlf = text.find("\r\n", from)) != std::string::npos; from = crlf + 2)
+        lines.push_back(text.substr(from, crlf - from));
+    EXPECT_EQ(from, text.size()) << "text after the last CR LF";
+    return lines;
+}
+
 TEST_F(OutputFilesTest, BlocksAboveThe16BitRangeWriteEveryLine) {
     global::num_points = 65536;
     std::vector<double> samples(65536);
@@ -302,12 +311,7 @@ TEST_F(OutputFilesTest, BlocksAboveThe16BitRangeWriteEveryLine) {
     write(global::flag_false);
     EXPECT_TRUE(messages.empty());
 
-    const std::string text = contents(path("big.txt"));
-    std::vector<std::string> lines;
-    size_t from = 0;
-    for (size_t crlf; (crlf = text.find("\r\n", from)) != std::string::npos; from = crlf + 2)
-        lines.push_back(text.substr(from, crlf - from));
-    EXPECT_EQ(from, text.size());
+    const std::vector<std::string> lines = split_crlf_lines(contents(path("big.txt")));
     ASSERT_EQ(lines.size(), 65537u);
     EXPECT_EQ(lines[0], "\"-29.296875\"");
     EXPECT_EQ(lines[30000], "\" 0\"");
@@ -318,6 +322,22 @@ TEST_F(OutputFilesTest, BlocksAboveThe16BitRangeWriteEveryLine) {
     EXPECT_EQ(lines[65536], "\" 0\"");
     for (size_t k = 0; k < 65536; ++k)
         ASSERT_EQ(numtext::val(std::string_view(lines[k]).substr(1)), samples[k]) << "line " << k;
+
+    // Larger still, in repeat mode, from an array that ends part way: every line in order, the
+    // missing samples as 0.
+    global::num_points = 140000;
+    std::vector<double> counting(100000);
+    for (size_t k = 0; k < counting.size(); ++k)
+        counting[k] = static_cast<double>(k);
+    global::trace_data(0) = counting;
+    write(global::flag_true);
+    const std::vector<std::string> both = split_crlf_lines(contents(path("big.txt")));
+    ASSERT_EQ(both.size(), 65537u + 140001u);
+    for (size_t k = 0; k <= 140000; ++k) {
+        const std::string want = k < 100000 ? "\" " + std::to_string(k) + "\"" : "\" 0\"";
+        ASSERT_EQ(both[65537 + k], want) << "line " << k;
+    }
+    EXPECT_TRUE(messages.empty());
 }
 
 TEST_F(OutputFilesTest, ArrayShorterThanTheBlockWritesZerosForTheMissingSamples) {
