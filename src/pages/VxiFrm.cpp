@@ -1,8 +1,10 @@
 #include "pages/VxiFrm.h"
 
 #include <QCursor>
+#include <QStyle>
 #include <algorithm>
 #include <array>
+#include <cmath>
 
 #include "core/dialogs.h"
 #include "core/global.h"
@@ -15,6 +17,30 @@ namespace {
 
 QString number_text(int32_t value) {
     return QString::fromStdString(numtext::text(value));
+}
+
+// The page is divided into 20 rows below 16 modules and into count + 10 rows from 16 on, the
+// rows of module i starting at row i + 3. With 14 or 15 modules twenty rows would run into the
+// OK button, so the rows then shrink to the whole pixels that end above it.
+double row_divisor(int32_t module_count, double inner_height, double ok_top, double twips_per_pixel) {
+    const double rule = module_count < 16 ? 20.0 : static_cast<double>(module_count) + 10.0;
+    const double rows_end = static_cast<double>(module_count) + 4.0;
+    if (rows_end * inner_height / rule <= ok_top)
+        return rule;
+    const double row_pixels = std::floor(ok_top / rows_end / twips_per_pixel);
+    if (row_pixels < 1)
+        return rule;
+    return inner_height / (row_pixels * twips_per_pixel);
+}
+
+// Sets a display box to its designed width, or wider when the style's frame and margins would
+// otherwise cut its text.
+void fit_width(QLineEdit* box, double designed_twips) {
+    twips::set_width(box, designed_twips);
+    const int frame = box->style()->pixelMetric(QStyle::PM_DefaultFrameWidth, nullptr, box);
+    const int needed = box->fontMetrics().horizontalAdvance(box->text()) + 2 * frame + 2 * 2 + 2;
+    if (box->width() < needed)
+        box->resize(needed, box->height());
 }
 
 }  // namespace
@@ -86,7 +112,11 @@ void VxiFrm::Form_Resize() {
     const double w = ScaleWidth();
     const double h = ScaleHeight();
     const double outer_h = Height();
-    const double rows = module_count < 16 ? 20.0 : static_cast<double>(module_count) + 10.0;
+    // OK goes first: the module rows must end above it.
+    place_ok_cancel(*this, doneBtn, cancelBtn);
+    cancelBtn->hide();
+    cancelBtn->setEnabled(false);
+    const double rows = row_divisor(module_count, h, twips::top(doneBtn), twips_per_pixel_y());
     const double x = w / 10;
     auto tw = [this](const QString& s) { return TextWidth(s); };
 
@@ -142,15 +172,11 @@ void VxiFrm::Form_Resize() {
     twips::set_width(VName, tw(VName->text()) + 100);
     twips::set_left(RNameTxt, twips::width(VName) + x);
     RNameTxt->setText(QString::fromStdString(interface_name));
-    twips::set_width(RNameTxt, tw(RNameTxt->text()) + 100);
+    fit_width(RNameTxt, tw(RNameTxt->text()) + 100);
     twips::set_left(revlbl, twips::left(RNameTxt) + twips::width(RNameTxt) + x);
     twips::set_left(revtxt, twips::left(revlbl) + twips::width(revlbl) + 100);
     revtxt->setText(QString::fromStdString(driver_revision));
-    twips::set_width(revtxt, tw(revtxt->text()) + 100);
-
-    place_ok_cancel(*this, doneBtn, cancelBtn);
-    cancelBtn->hide();
-    cancelBtn->setEnabled(false);
+    fit_width(revtxt, tw(revtxt->text()) + 100);
 }
 
 void VxiFrm::UseCkbx_Click(int16_t Index) {

@@ -88,6 +88,12 @@ TEST_F(DispFrmTest, OkStoresChannelsAndFilesAndTheNextVisitShowsThem) {
     EXPECT_TRUE(main().isVisible());
     EXPECT_FALSE(page.isVisible());
     EXPECT_FALSE(page.isEnabled());
+    // The main window shows the one trace left, labelled with its channel, at the top.
+    EXPECT_TRUE(main().ChanLbl[0]->isVisible());
+    EXPECT_EQ(main().ChanLbl[0]->text().toStdString(), "Chan 3");
+    EXPECT_FALSE(main().ChanLbl[1]->isVisible());
+    EXPECT_TRUE(main().CRTpic[0]->isVisible());
+    EXPECT_FALSE(main().CRTpic[1]->isVisible());
 
     switch_page(main(), page);
     EXPECT_EQ(texts(page), (Texts{"OFF", "3", "OFF", "OFF"}));

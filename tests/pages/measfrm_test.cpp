@@ -7,6 +7,7 @@
 #include "core/global.h"
 #include "core/windows.h"
 #include "display/MainFrm.h"
+#include "measure/measurement.h"
 #include "page_readability.h"
 #include "pages/MeasFrm.h"
 #include "panel_fixture.h"
@@ -216,6 +217,31 @@ TEST_F(MeasFrmTest, CancelChangesNothingAndTheNextOpeningShowsTheStoredSettings)
     EXPECT_TRUE(page.AutoBtn->isChecked());
     EXPECT_FALSE(page.mmcheck->isChecked());
     EXPECT_EQ(page.BlocksizeTxt->text().toStdString(), " 1024");
+}
+
+TEST_F(MeasFrmTest, TheNextSetUpSendsWhatOkStored) {
+    MeasFrm& page = open_page();
+    click(page.ContBtn);
+    click(page.FreqBtn);
+    click(page.ManualBtn);
+    type(page.BlocksizeTxt, "2048");
+    type(page.SpanTxt, "10000");
+    click(page.doneBtn);
+    sim::clear_call_log();
+    setup_measurement();  // what Go runs first
+
+    auto sent = [](const std::string& name) {
+        for (const sim::Call& c : sim::call_log())
+            if (c.name == name)
+                return c.args.back();
+        return std::string("not sent");
+    };
+    EXPECT_EQ(sent("ost7720_setBlocksize"), "2048");
+    EXPECT_EQ(sent("ost7720_setSpan"), "10000");
+    EXPECT_EQ(sent("ost7720_setDataMode"), "341");     // continuous
+    EXPECT_EQ(sent("ost7720_setCalcData"), "725");     // frequency
+    EXPECT_EQ(sent("ost7720_setAutoTrigger"), "440");  // not automatic
+    EXPECT_EQ(sent("ost7720_setArmMode"), "431");      // one mainframe
 }
 
 TEST_F(MeasFrmTest, FramesStandInTwoReadableColumns) {

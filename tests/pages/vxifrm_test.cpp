@@ -116,6 +116,27 @@ TEST_F(VxiFrmTest, RowHeightIsATwentiethBelowSixteenModulesAndCountPlusTenFrom) 
     EXPECT_EQ(page_check::layout_faults(&big), std::vector<std::string>{});
 }
 
+TEST_F(VxiFrmTest, RowsOfFourteenOrFifteenModulesShrinkToEndAboveOk) {
+    std::vector<sim::ModuleSpec> modules = sixteen_modules();
+    modules.resize(15);
+    VxiFrm& page = open_page(modules);
+    page.resize(900, 700);
+    // Twenty rows of 35 px would put module 15 at 630..665 px, across OK (near 0.9 of the
+    // height); the rows take the whole pixels that end above it: 19 x 31 = 589.
+    EXPECT_EQ(page.LALbl[15]->height(), 31);
+    EXPECT_EQ(page.LALbl[15]->geometry().bottom(), 19 * 31 - 1);
+    EXPECT_LT(page.LALbl[15]->geometry().bottom(), page.doneBtn->y());
+    EXPECT_EQ(page_check::layout_faults(&page), std::vector<std::string>{});
+
+    // Thirteen modules fit in twenty rows: 17 x 35 = 595 px.
+    forms::destroy_all();
+    modules.resize(13);
+    VxiFrm& thirteen = open_page(modules);
+    thirteen.resize(900, 700);
+    EXPECT_EQ(thirteen.LALbl[13]->height(), 35);
+    EXPECT_LT(thirteen.LALbl[13]->geometry().bottom(), thirteen.doneBtn->y());
+}
+
 TEST_F(VxiFrmTest, UncheckedModuleLeavesTheSessionAfterOk) {
     VxiFrm& page = open_page({{8, 8, 1, 2, 8}, {16, 4, 2, 0, 32}});
     const int32_t old_session = global::session;
