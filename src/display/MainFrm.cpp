@@ -34,6 +34,19 @@ void style_screen(PictureBox* pic) {
     pic->setPalette(pal);
 }
 
+// The scale boxes read as the screen's scale: plain numbers beside its top and bottom edges,
+// legible although the panel keeps them disabled.
+void style_scale_box(QLineEdit* box) {
+    box->setFrame(false);
+    box->setAlignment(Qt::AlignRight | Qt::AlignVCenter);
+    QPalette pal = box->palette();
+    for (auto group : {QPalette::Active, QPalette::Inactive, QPalette::Disabled}) {
+        pal.setColor(group, QPalette::Text, pal.color(QPalette::Active, QPalette::WindowText));
+        pal.setColor(group, QPalette::Base, pal.color(QPalette::Active, QPalette::Window));
+    }
+    box->setPalette(pal);
+}
+
 }  // namespace
 
 MainFrm::MainFrm() : Form(QStringLiteral("Ostrana K7720A Soft Front Panel")) {
@@ -55,6 +68,8 @@ MainFrm::MainFrm() : Form(QStringLiteral("Ostrana K7720A Soft Front Panel")) {
         LowTxt[i] = new QLineEdit(this);
         ChanLbl[i] = new QLabel(QStringLiteral("Chan#"), this);
         style_screen(CRTpic[i]);
+        style_scale_box(HighTxt[i]);
+        style_scale_box(LowTxt[i]);
         ChanLbl[i]->resize(ChanLbl[i]->width(), ChanLbl[i]->fontMetrics().height());
         auto index = static_cast<int16_t>(i);
         connect(HighTxt[i], &QLineEdit::textChanged, this, [this, index] { hightxt_Change(index); });

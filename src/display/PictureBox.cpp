@@ -6,6 +6,7 @@
 #include <cmath>
 #include <cstdlib>
 #include <cstring>
+#include <vector>
 
 namespace {
 
@@ -15,14 +16,40 @@ int64_t far_bound(int w, int h) {
     return 4 * (static_cast<int64_t>(w) + h) + 64;
 }
 
-// One device coordinate to the pixel that contains it; the far edge (offset == size)
-// belongs to the last pixel. Saturated well inside int64_t.
-int64_t snap(double offset, int size) {
+// One finite device coordinate to the pixel that contains it; the far edge (offset == size)
+// belongs to the last pixel. Saturated at a billion pixels, far beyond any clipping bound.
+inline int32_t snap(double offset, int size) {
     if (offset == size)
         return size - 1;
-    constexpr double limit = 1e15;
-    return static_cast<int64_t>(std::floor(std::clamp(offset, -limit, limit)));
+    constexpr double limit = 1e9;
+    offset = std::clamp(offset, -limit, limit);
+    const auto whole = static_cast<int32_t>(offset);  // toward zero; one down for negatives
+    return whole > offset ? whole - 1 : whole;
 }
+
+struct Pixel {
+    int32_t x, y;
+    bool ok;  // false for a point with no device position (not finite, or no valid scale)
+};
+
+// User coordinates to device pixels: a point lands at offset (x - x1) / (x2 - x1) * width
+// from the left edge and (y - y1) / (y2 - y1) * height from the top edge. Every drawing call
+// maps through this one function, so the same point always gives the same pixel.
+struct Mapping {
+    double x1, y1, span_x, span_y;
+    int w, h;
+    bool ok;
+
+    Pixel operator()(double x, double y) const {
+        if (!ok)
+            return {0, 0, false};
+        const double dx = (x - x1) / span_x * w;
+        const double dy = (y - y1) / span_y * h;
+        if (!std::isfinite(dx) || !std::isfinite(dy))
+            return {0, 0, false};
+        return {snap(dx, w), snap(dy, h), true};
+    }
+};
 
 // Liang-Barsky clip of a segment to [lo_x, hi_x] x [lo_y, hi_y]; false when nothing is left.
 bool clip(double& x0, double& y0, double& x1, double& y1, double lo_x, double lo_y, double hi_x,
@@ -115,33 +142,23 @@ double PictureBox::device_y(double y) const {
     return (y - sy1_) / (sy2_ - sy1_) * h;
 }
 
-PictureBox::Pixel PictureBox::to_pixel(double x, double y) const {
-    if (!scale_ok_)
-        return {0, 0, false};
-    const double dx = device_x(x), dy = device_y(y);
-    if (!std::isfinite(dx) || !std::isfinite(dy))
-        return {0, 0, false};
-    return {snap(dx, image_.width()), snap(dy, image_.height()), true};
-}
-
-void PictureBox::column_run(int64_t x, int64_t y0, int64_t y1, QRgb color) {
+void PictureBox::column_run(int32_t x, int32_t y0, int32_t y1, QRgb color) {
     const int w = image_.width(), h = image_.height();
     if (x < 0 || x >= w)
         return;
     if (y0 > y1)
         std::swap(y0, y1);
-    y0 = std::max<int64_t>(y0, 0);
-    y1 = std::min<int64_t>(y1, h - 1);
+    y0 = std::max(y0, 0);
+    y1 = std::min(y1, h - 1);
     uchar* bits = image_.bits();
     const qsizetype stride = image_.bytesPerLine();
-    for (int64_t y = y0; y <= y1; ++y)
+    for (qsizetype y = y0; y <= y1; ++y)
         reinterpret_cast<QRgb*>(bits + y * stride)[x] = color;
 }
 
-// Integer line from a to b, both end pixels included (all octants, stepping from a to b).
-void PictureBox::segment(Pixel a, Pixel b, QRgb color) {
-    if (!a.ok || !b.ok)
-        return;
+// All octants, stepping from a to b.
+void PictureBox::segment(int32_t ax, int32_t ay, int32_t bx, int32_t by, QRgb color) {
+    Pixel a{ax, ay, true}, b{bx, by, true};
     const int w = image_.width(), h = image_.height();
     const int64_t far = far_bound(w, h);
     auto outside = [&](const Pixel& p) { return p.x < -far || p.x > w + far || p.y < -far || p.y > h + far; };
@@ -150,8 +167,8 @@ void PictureBox::segment(Pixel a, Pixel b, QRgb color) {
         double x1 = static_cast<double>(b.x), y1 = static_cast<double>(b.y);
         if (!clip(x0, y0, x1, y1, -2.0, -2.0, w + 1.0, h + 1.0))
             return;
-        a = {std::llround(x0), std::llround(y0), true};
-        b = {std::llround(x1), std::llround(y1), true};
+        a = {static_cast<int32_t>(std::lround(x0)), static_cast<int32_t>(std::lround(y0)), true};
+        b = {static_cast<int32_t>(std::lround(x1)), static_cast<int32_t>(std::lround(y1)), true};
     }
     if (a.x == b.x) {
         column_run(a.x, a.y, b.y, color);
@@ -159,7 +176,7 @@ void PictureBox::segment(Pixel a, Pixel b, QRgb color) {
     }
     uchar* bits = image_.bits();
     const qsizetype stride = image_.bytesPerLine();
-    const int64_t dx = std::llabs(b.x - a.x), dy = -std::llabs(b.y - a.y);
+    const int64_t dx = std::llabs(int64_t{b.x} - a.x), dy = -std::llabs(int64_t{b.y} - a.y);
     const int sx = a.x < b.x ? 1 : -1, sy = a.y < b.y ? 1 : -1;
     int64_t err = dx + dy, x = a.x, y = a.y;
     for (;;) {
@@ -181,7 +198,10 @@ void PictureBox::segment(Pixel a, Pixel b, QRgb color) {
 
 void PictureBox::line(double x1, double y1, double x2, double y2, const QColor& color) {
     ensure_image();
-    segment(to_pixel(x1, y1), to_pixel(x2, y2), color.rgb());
+    const Mapping map{sx1_, sy1_, sx2_ - sx1_, sy2_ - sy1_, image_.width(), image_.height(), scale_ok_};
+    const Pixel a = map(x1, y1), b = map(x2, y2);
+    if (a.ok && b.ok)
+        segment(a.x, a.y, b.x, b.y, color.rgb());
     cur_x_ = x2;
     cur_y_ = y2;
     update();
@@ -203,34 +223,39 @@ void PictureBox::polyline_to(const QPointF* points, int n) {
     const QRgb color = foreground().rgb();
     const int h = image_.height();
     const int64_t far = far_bound(image_.width(), h);
-    auto near_rows = [&](const Pixel& p) { return p.y >= -far && p.y <= h + far; };
+    const Mapping map{sx1_, sy1_, sx2_ - sx1_, sy2_ - sy1_, image_.width(), h, scale_ok_};
+
+    // Every point to its pixel first (element 0 is the current position), noting which
+    // points may join a column chain: those with a position not far above or below.
+    static thread_local std::vector<Pixel> pixels;
+    static thread_local std::vector<uint8_t> chainable;
+    pixels.resize(static_cast<size_t>(n) + 1);
+    chainable.resize(static_cast<size_t>(n) + 1);
+    for (int k = 0; k <= n; ++k) {
+        const Pixel p = k == 0 ? map(cur_x_, cur_y_) : map(points[k - 1].x(), points[k - 1].y());
+        pixels[k] = p;
+        chainable[k] = p.ok && p.y >= -far && p.y <= h + far;
+    }
 
     // Consecutive points in one pixel column form a chain of vertical segments whose pixels
     // are exactly the rows from the chain's lowest to its highest point: drawn as one run.
-    Pixel cur = to_pixel(cur_x_, cur_y_);
-    bool chain = false;
-    int64_t chain_x = 0, chain_lo = 0, chain_hi = 0;
-    for (int k = 0; k < n; ++k) {
-        const Pixel p = to_pixel(points[k].x(), points[k].y());
-        if (cur.ok && p.ok && p.x == cur.x && near_rows(cur) && near_rows(p)) {
-            if (!chain) {
-                chain = true;
-                chain_x = cur.x;
-                chain_lo = chain_hi = cur.y;
+    // Every other segment is drawn as line() draws it.
+    int k = 1;
+    while (k <= n) {
+        const Pixel& a = pixels[k - 1];
+        if (chainable[k - 1] && chainable[k] && pixels[k].x == a.x) {
+            int32_t lo = a.y, hi = a.y;
+            for (; k <= n && chainable[k] && pixels[k].x == a.x; ++k) {
+                lo = std::min(lo, pixels[k].y);
+                hi = std::max(hi, pixels[k].y);
             }
-            chain_lo = std::min(chain_lo, p.y);
-            chain_hi = std::max(chain_hi, p.y);
-        } else {
-            if (chain) {
-                column_run(chain_x, chain_lo, chain_hi, color);
-                chain = false;
-            }
-            segment(cur, p, color);
+            column_run(a.x, lo, hi, color);
+            continue;
         }
-        cur = p;
+        if (a.ok && pixels[k].ok)
+            segment(a.x, a.y, pixels[k].x, pixels[k].y, color);
+        ++k;
     }
-    if (chain)
-        column_run(chain_x, chain_lo, chain_hi, color);
     cur_x_ = points[n - 1].x();
     cur_y_ = points[n - 1].y();
     update();

@@ -52,15 +52,10 @@ class PictureBox : public QWidget {
     void resizeEvent(QResizeEvent* event) override;
 
   private:
-    struct Pixel {
-        int64_t x, y;
-        bool ok;  // false for a point that has no device position (non-finite, invalid scale)
-    };
-
     void ensure_image();
-    Pixel to_pixel(double x, double y) const;
-    void segment(Pixel a, Pixel b, QRgb color);
-    void column_run(int64_t x, int64_t y0, int64_t y1, QRgb color);
+    // Integer line between two device pixels, both ends included.
+    void segment(int32_t ax, int32_t ay, int32_t bx, int32_t by, QRgb color);
+    void column_run(int32_t x, int32_t y0, int32_t y1, QRgb color);
 
     QImage image_;
     double sx1_ = 0, sy1_ = 0, sx2_ = 1, sy2_ = 1;
