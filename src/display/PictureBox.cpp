@@ -36,15 +36,15 @@ struct Pixel {
 // from the left edge and (y - y1) / (y2 - y1) * height from the top edge. Every drawing call
 // maps through this one function, so the same point always gives the same pixel.
 struct Mapping {
-    double x1, y1, span_x, span_y;
+    double x1, y1, x2, y2;
     int w, h;
     bool ok;
 
     Pixel operator()(double x, double y) const {
         if (!ok)
             return {0, 0, false};
-        const double dx = (x - x1) / span_x * w;
-        const double dy = (y - y1) / span_y * h;
+        const double dx = (x - x1) / (x2 - x1) * w;
+        const double dy = (y - y1) / (y2 - y1) * h;
         if (!std::isfinite(dx) || !std::isfinite(dy))
             return {0, 0, false};
         return {snap(dx, w), snap(dy, h), true};
@@ -198,7 +198,7 @@ void PictureBox::segment(int32_t ax, int32_t ay, int32_t bx, int32_t by, QRgb co
 
 void PictureBox::line(double x1, double y1, double x2, double y2, const QColor& color) {
     ensure_image();
-    const Mapping map{sx1_, sy1_, sx2_ - sx1_, sy2_ - sy1_, image_.width(), image_.height(), scale_ok_};
+    const Mapping map{sx1_, sy1_, sx2_, sy2_, image_.width(), image_.height(), scale_ok_};
     const Pixel a = map(x1, y1), b = map(x2, y2);
     if (a.ok && b.ok)
         segment(a.x, a.y, b.x, b.y, color.rgb());
@@ -223,39 +223,37 @@ void PictureBox::polyline_to(const QPointF* points, int n) {
     const QRgb color = foreground().rgb();
     const int h = image_.height();
     const int64_t far = far_bound(image_.width(), h);
-    const Mapping map{sx1_, sy1_, sx2_ - sx1_, sy2_ - sy1_, image_.width(), h, scale_ok_};
-
-    // Every point to its pixel first (element 0 is the current position), noting which
-    // points may join a column chain: those with a position not far above or below.
-    static thread_local std::vector<Pixel> pixels;
-    static thread_local std::vector<uint8_t> chainable;
-    pixels.resize(static_cast<size_t>(n) + 1);
-    chainable.resize(static_cast<size_t>(n) + 1);
-    for (int k = 0; k <= n; ++k) {
-        const Pixel p = k == 0 ? map(cur_x_, cur_y_) : map(points[k - 1].x(), points[k - 1].y());
-        pixels[k] = p;
-        chainable[k] = p.ok && p.y >= -far && p.y <= h + far;
-    }
+    const Mapping map{sx1_, sy1_, sx2_, sy2_, image_.width(), h, scale_ok_};
+    // Points with a position not far above or below may join a column chain.
+    auto chainable = [&](const Pixel& p) { return p.ok && p.y >= -far && p.y <= h + far; };
 
     // Consecutive points in one pixel column form a chain of vertical segments whose pixels
     // are exactly the rows from the chain's lowest to its highest point: drawn as one run.
     // Every other segment is drawn as line() draws it.
-    int k = 1;
-    while (k <= n) {
-        const Pixel& a = pixels[k - 1];
-        if (chainable[k - 1] && chainable[k] && pixels[k].x == a.x) {
-            int32_t lo = a.y, hi = a.y;
-            for (; k <= n && chainable[k] && pixels[k].x == a.x; ++k) {
-                lo = std::min(lo, pixels[k].y);
-                hi = std::max(hi, pixels[k].y);
-            }
-            column_run(a.x, lo, hi, color);
-            continue;
+    Pixel prev = map(cur_x_, cur_y_);
+    bool prev_chainable = chainable(prev);
+    bool chain = false;
+    int32_t lo = prev.y, hi = prev.y;
+    for (int k = 0; k < n; ++k) {
+        const Pixel p = map(points[k].x(), points[k].y());
+        const bool p_chainable = chainable(p);
+        if (p_chainable && prev_chainable && p.x == prev.x) {
+            lo = std::min(lo, p.y);
+            hi = std::max(hi, p.y);
+            chain = true;
+        } else {
+            if (chain)
+                column_run(prev.x, lo, hi, color);
+            chain = false;
+            if (prev.ok && p.ok)
+                segment(prev.x, prev.y, p.x, p.y, color);
+            lo = hi = p.y;
         }
-        if (a.ok && pixels[k].ok)
-            segment(a.x, a.y, pixels[k].x, pixels[k].y, color);
-        ++k;
+        prev = p;
+        prev_chainable = p_chainable;
     }
+    if (chain)
+        column_run(prev.x, lo, hi, color);
     cur_x_ = points[n - 1].x();
     cur_y_ = points[n - 1].y();
     update();
