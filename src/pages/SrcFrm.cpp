@@ -2,6 +2,7 @@
 
 #include <QCompleter>
 #include <QEvent>
+#include <QPalette>
 #include <QScopedValueRollback>
 #include <QStringList>
 #include <algorithm>
@@ -89,10 +90,18 @@ SrcFrm::SrcFrm() : Form(QStringLiteral("Source Setup")) {
     SeedTxt = text_box();
     RangeLbl = label("Range");
     RangeTxt = text_box();
-    NoteTxt = new QPlainTextEdit(this);
+    NoteTxt = new QTextEdit(this);
     NoteTxt->setReadOnly(true);
-    NoteTxt->setLineWrapMode(QPlainTextEdit::NoWrap);
+    NoteTxt->setLineWrapMode(QTextEdit::NoWrap);
+    NoteTxt->setHorizontalScrollBarPolicy(Qt::ScrollBarAlwaysOff);
     NoteTxt->document()->setDocumentMargin(2);
+    {
+        // Every load disables the box; its hints must still read as plainly as enabled text.
+        QPalette pal = NoteTxt->palette();
+        pal.setColor(QPalette::Disabled, QPalette::Text, pal.color(QPalette::Active, QPalette::Text));
+        pal.setColor(QPalette::Disabled, QPalette::Base, pal.color(QPalette::Active, QPalette::Base));
+        NoteTxt->setPalette(pal);
+    }
     NoteTxt->hide();
     doneBtn = new QPushButton(QStringLiteral("OK"), this);
     cancelBtn = new QPushButton(QStringLiteral("Cancel"), this);
@@ -277,10 +286,11 @@ void SrcFrm::load_controls() {
         NoteTxt->hide();
         return;
     }
-    // One hint a line, each line ended, under the heading.
-    QString note = QStringLiteral("No Source?  Try:\n");
+    // One hint a line under the heading. The box would show the break after the last hint as
+    // an empty line, which only costs room, so the text ends with the last hint.
+    QString note = QStringLiteral("No Source?  Try:");
     for (const char* hint : hints)
-        note += QString::fromUtf8(hint) + QLatin1Char('\n');
+        note += QLatin1Char('\n') + QString::fromUtf8(hint);
     NoteTxt->setPlainText(note);
     NoteTxt->show();
 }

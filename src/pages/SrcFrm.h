@@ -5,8 +5,8 @@
 #include <QComboBox>
 #include <QLabel>
 #include <QLineEdit>
-#include <QPlainTextEdit>
 #include <QPushButton>
+#include <QTextEdit>
 #include <cstdint>
 
 #include "core/Form.h"
@@ -66,7 +66,7 @@ class SrcFrm : public Form {
     QLineEdit* SeedTxt;
     QLabel* RangeLbl;
     QLineEdit* RangeTxt;
-    QPlainTextEdit* NoteTxt;
+    QTextEdit* NoteTxt;
     QPushButton* doneBtn;
     QPushButton* cancelBtn;
 

@@ -194,7 +194,7 @@ TEST_F(SrcFrmTest, EverySixHintsInOrderAndNoneAtTheirBoundaries) {
               "RampRate -> 0\n"
               "Range -> higher\n"
               "Freq -> higher\n"
-              "Duty Cycle -> 1\n");
+              "Duty Cycle -> 1");
     EXPECT_EQ(text(page.ActiveCmbo), "Off");
     EXPECT_EQ(text(page.OutputCmbo), "Grounded");
     EXPECT_EQ(text(page.RampRateTxt), "2.5");
@@ -211,7 +211,7 @@ TEST_F(SrcFrmTest, EverySixHintsInOrderAndNoneAtTheirBoundaries) {
     set(ost7720_setSineFreq, src1, 100.0);
     click(page.cancelBtn);
     open_page();
-    EXPECT_EQ(page.NoteTxt->toPlainText().toStdString(), "No Source?  Try:\nDuty Cycle -> 1\n");
+    EXPECT_EQ(page.NoteTxt->toPlainText().toStdString(), "No Source?  Try:\nDuty Cycle -> 1");
     set(ost7720_setDutyCycle, src1, 0.5);
     click(page.cancelBtn);
     open_page();
