@@ -4,7 +4,6 @@
 #include <QGuiApplication>
 #include <QScreen>
 
-#include <algorithm>
 #include <climits>
 #include <span>
 
