@@ -40,6 +40,10 @@ constexpr InputMode input_modes[] = {
     {"VOLT", 130}, {"ICP", 131}, {"CHARGE", 132}, {"MIC", 133}, {"MIC_200V", 134},
 };
 
+// Room kept between a label and its field, and between a field and the next column, in twips.
+constexpr double label_gap = 60;
+constexpr double column_gap = 100;
+
 constexpr double range_floor = 0.0;
 constexpr double range_ceiling = 20.0;
 
@@ -112,6 +116,9 @@ InputFrm::InputFrm() : Form(QStringLiteral("Input Setup")) {
     AAALbl = label("Analog  Anti Alias");
     AAACmbo = combo({"On", "Off"});
     AAACmbo->setEditText(QStringLiteral("Not Adjustable"));
+    // Where a narrow window cuts the two fixed texts short, their start stays in view.
+    GndCmbo->lineEdit()->setCursorPosition(0);
+    AAACmbo->lineEdit()->setCursorPosition(0);
     inpmodeLbl = label("Input Mode");
     inpmodeCmbo = combo({"VOLT", "ICP", "CHARGE", "MIC", "MIC_200V"});
     inpmodeCmbo->setEditText(QStringLiteral("Combo1"));
@@ -149,7 +156,7 @@ double InputFrm::field_width() const {
     option.rect = QRect(0, 0, probe_width, CoupCmbo->height());
     const QRect edit = CoupCmbo->style()->subControlRect(QStyle::CC_ComboBox, &option,
                                                          QStyle::SC_ComboBoxEditField, CoupCmbo);
-    constexpr int edit_margins = 2 * 2 + 2;
+    constexpr int edit_margins = 2 * 2 + 6;
     int text = 0;
     for (const char* t : widest_field_texts)
         text = std::max(text, CoupCmbo->fontMetrics().horizontalAdvance(QString::fromUtf8(t)));
@@ -168,18 +175,38 @@ void InputFrm::Form_Resize() {
         {inpmodeLbl, inpmodeCmbo, 8}, {TrigOnLbl, TrigOnCmbo, 9}, {TrigModeLbl, TrigModeCmbo, 10},
         {TrigLvlLbl, TrigLvlTxt, 11}, {HystLbl, HystTxt, 12},     {TrigDirLbl, TrigDirCmbo, 13},
     };
-    // The grid fixes only where a field starts. Every field is wide enough for the longest fixed
-    // text, but a field of the first column never reaches into the labels of the second.
-    const double column_unit = ScaleWidth() / 12;
-    const double width = std::min(field_width(), 3.5 * column_unit - 100);
     for (const Row& row : rows) {
         place_in_grid(*this, row.label, row.index, 1);
         place_in_grid(*this, row.field, row.index, 2);
-        twips::set_width(row.field, width);
         if (row.field == GndCmbo)
             GndCmbo->setEnabled(false);
         if (row.field == AAACmbo)
             AAACmbo->setEnabled(false);
+    }
+    // The grid fixes only where a field starts. In a narrow window a label can be wider than the
+    // room the grid leaves it: the fields of that column then start after their widest label
+    // rather than covering its end. Every field is wide enough for the longest fixed text, but
+    // never reaches into the labels of the next column or past the right margin.
+    const double column_unit = ScaleWidth() / 12;
+    const double wanted = field_width();
+    for (const bool second : {false, true}) {
+        double left = 0;
+        double label_end = 0;
+        for (const Row& row : rows) {
+            if ((row.index >= 8) != second)
+                continue;
+            left = twips::left(row.field);
+            label_end = std::max(label_end, twips::left(row.label) + twips::width(row.label));
+        }
+        left = std::max(left, label_end + label_gap);
+        const double column_end = (second ? 11.5 : 5.5) * column_unit;
+        const double width = std::min(wanted, column_end - column_gap - left);
+        for (const Row& row : rows) {
+            if ((row.index >= 8) != second)
+                continue;
+            twips::set_left(row.field, left);
+            twips::set_width(row.field, width);
+        }
     }
     place_ok_cancel(*this, doneBtn, cancelBtn);
     place_in_grid(*this, AllSameChk, 0, 0);

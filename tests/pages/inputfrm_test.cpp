@@ -495,6 +495,22 @@ TEST_F(InputFrmTest, FieldsStandInTheGridAndStayReadable) {
                       ? 900
                       : 412);
     }
+
+    // In a narrow window the fields of a column start after its widest label, all at one left.
+    for (const QSize size : {QSize(533, 400), QSize(640, 480)}) {
+        SCOPED_TRACE(size.width());
+        p.resize(size);
+        EXPECT_EQ(page_check::layout_faults(&p), Texts{});
+        EXPECT_GT(p.ChnNumCmbo->x(), p.AAALbl->x() + p.AAALbl->width());
+        EXPECT_GT(p.inpmodeCmbo->x(), p.HystLbl->x() + p.HystLbl->width());
+        for (QWidget* field :
+             std::initializer_list<QWidget*>{p.RangeTxt, p.CoupCmbo, p.GndCmbo, p.DAACmbo, p.AAACmbo})
+            EXPECT_EQ(field->x(), p.ChnNumCmbo->x());
+        for (QWidget* field : std::initializer_list<QWidget*>{p.TrigOnCmbo, p.TrigModeCmbo, p.TrigLvlTxt,
+                                                              p.HystTxt, p.TrigDirCmbo})
+            EXPECT_EQ(field->x(), p.inpmodeCmbo->x());
+        EXPECT_LT(p.ChnNumCmbo->x() + p.ChnNumCmbo->width(), p.inpmodeLbl->x());
+    }
 }
 
 }  // namespace
