@@ -280,17 +280,6 @@ void MainFrm::scale_box_changed(QLineEdit* box, std::array<double, 5>& limits, i
     }
 }
 
-void MainFrm::GoBtn_Click() {}
-void MainFrm::TriggerBtn_Click() {}
-void MainFrm::MainTimer_Timer() {}
-void MainFrm::setup_data_wait() {}
-void MainFrm::stop_measurement() {}
-void MainFrm::MeasBtn_Click() {}
-void MainFrm::InpBtn_Click() {}
-void MainFrm::SrcBtn_Click() {}
-void MainFrm::DispBtn_Click() {}
-void MainFrm::VxiBtn_Click() {}
-
 void MainFrm::ExitBtn_Click() {
     exit_panel();
 }
