@@ -20,7 +20,7 @@
 
 namespace {
 
-// Stores nothing itself: the caller has put the call's result into global::status.
+// After a driver call whose result is in global::status: reports a failure; true on success.
 bool call_ok(const char* name) {
     if (global::status == 0)
         return true;
