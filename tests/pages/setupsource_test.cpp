@@ -358,4 +358,58 @@ TEST_F(SetupsourceTest, ASourceNumberOutOfRangeWritesNothing) {
     EXPECT_EQ(calls({"ost7720_setSourceMode"}), Lines{"ost7720_setSourceMode(4098, 170)"});
 }
 
+// End to end on the simulator: what the Source page sets is what input 1 shows after Go. At
+// span 20000 Hz a block of 1024 samples lasts 1024 / 51200 s = 20 ms.
+TEST_F(SetupsourceTest, WhatThePageSetsIsWhatTheTracesShowAfterGo) {
+    constexpr double block_seconds = 1024.0 / 51200.0;
+    MainFrm& main = forms::get<MainFrm>();
+    sim::use_virtual_clock();
+    auto one_block = [&main] {
+        QTest::mouseClick(main.GoBtn, Qt::LeftButton);
+        sim::advance_clock(block_seconds);
+        main.MainTimer_Timer();
+        return global::trace1_data;
+    };
+
+    SrcFrm& page = open_on(3);
+    put(page.FreqTxt, "2000");
+    QTest::mouseClick(page.doneBtn, Qt::LeftButton);
+    ASSERT_TRUE(main.isVisible());
+    std::vector<double> trace = one_block();
+    ASSERT_GE(trace.size(), 1024u);
+    // Two periods per ms: 40 rising zero crossings in 20 ms (one more or less by where the
+    // block starts in a period).
+    int rising = 0;
+    for (size_t i = 1; i < 1024; ++i)
+        rising += trace[i - 1] < 0 && trace[i] >= 0 ? 1 : 0;
+    EXPECT_GE(rising, 39);
+    EXPECT_LE(rising, 40);
+    EXPECT_NEAR(*std::max_element(trace.begin(), trace.begin() + 1024), 1.0, 0.02);
+
+    // Arbitrary: the swapped-quarter ramp, one table entry a sample, entry v showing as
+    // v / 2^31 V at range 1; the block starts somewhere in the table.
+    switch_page(main, page);
+    ASSERT_EQ(page.cur_src, 3);
+    put(page.ModeCmbo, "Arbitrary");
+    QTest::mouseClick(page.doneBtn, Qt::LeftButton);
+    ASSERT_TRUE(main.isVisible());
+    EXPECT_TRUE(messages.empty());
+    trace = one_block();
+    ASSERT_GE(trace.size(), 1024u);
+    const double volts = 1.0 / 2147483648.0;
+    const int32_t expected[] = {536750000,  553523438,  1071403320, 0,         534653320,
+                                1610250000, 2144903320, 1073500000, 1608153320};
+    const size_t at[] = {0, 8, 255, 256, 511, 512, 767, 768, 1023};
+    double best = 1e9;
+    for (size_t start = 0; start < 1024; ++start) {
+        double worst = 0;
+        for (size_t j = 0; j < std::size(at); ++j) {
+            const size_t i = (at[j] + 1024 - start) % 1024;  // the sample that shows entry at[j]
+            worst = std::max(worst, std::abs(trace[i] - expected[j] * volts));
+        }
+        best = std::min(best, worst);
+    }
+    EXPECT_LT(best, 0.01);
+}
+
 }  // namespace
