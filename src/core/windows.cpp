@@ -36,6 +36,11 @@ void set_main_form(Form* form) {
     registry().main = form;
 }
 
+void forget_main_form(const Form* form) {
+    if (registry().main == form)
+        registry().main = nullptr;
+}
+
 void destroy_all() {
     Registry& r = registry();
     r.by_type.clear();

@@ -24,6 +24,8 @@ F& get() {
 // The main window, for procedures outside the display layer (start-up, page switch).
 Form& main_form();
 void set_main_form(Form* form);
+// A main window going away stops being the main window (if it still is).
+void forget_main_form(const Form* form);
 
 // Destroys every window (tests).
 void destroy_all();

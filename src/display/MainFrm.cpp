@@ -85,10 +85,7 @@ MainFrm::MainFrm() : Form(QStringLiteral("Ostrana K7720A Soft Front Panel")) {
     connect(VxiBtn, &QPushButton::clicked, this, &MainFrm::VxiBtn_Click);
 }
 
-MainFrm::~MainFrm() {
-    if (&forms::main_form() == this)
-        forms::set_main_form(nullptr);
-}
+MainFrm::~MainFrm() { forms::forget_main_form(this); }
 
 void MainFrm::Form_Load() {
     const QRect screen = QGuiApplication::primaryScreen()->geometry();
