@@ -42,6 +42,13 @@ void report_driver_error(const std::string& name, int32_t code) {
         end_program();
 }
 
+bool driver_ok(const char* name) {
+    if (global::status == 0)
+        return true;
+    report_driver_error(name, global::status);
+    return false;
+}
+
 void exit_panel() {
     global::status = ost7720_close(global::session);
     if (global::status != 0)

@@ -53,8 +53,7 @@ void probe_module(int32_t k, std::string& error_buffer) {
 
     int32_t total = 0, inputs = 0, sources = 0, tachs = 0;
     status = ost7720_getNumChans(handle, &total, &inputs, &sources, &tachs);
-    if (status != 0)
-        report_driver_error("ost7720_getNumChans", status);
+    driver_ok("ost7720_getNumChans");
     module_inputs[k] = inputs;
     module_sources[k] = sources;
     module_tachs[k] = tachs;
@@ -108,8 +107,7 @@ void open_session() {
     using namespace global;
     if (session != 0) {
         status = ost7720_close(session);
-        if (status != 0)
-            report_driver_error("ost7720_close", status);
+        driver_ok("ost7720_close");
         session = 0;
     }
     group_all = group_inputs = group_sources = group_tachs = 0;
@@ -117,12 +115,10 @@ void open_session() {
     const std::string list = getRscsString();
     if (list.size() > 1) {
         status = ost7720_init(list.c_str(), 1, 1, &session);
-        if (status != 0)
-            report_driver_error("ost7720_init", status);
+        driver_ok("ost7720_init");
         int32_t total = 0, inputs = 0, sources = 0, tachs = 0;
         status = ost7720_getNumChans(session, &total, &inputs, &sources, &tachs);
-        if (status != 0)
-            report_driver_error("ost7720_getNumChans", status);
+        driver_ok("ost7720_getNumChans");
         // Counts come from the driver: never let a negative one or a total smaller than the
         // parts size an array that the loops below then overrun.
         inputs = std::max(inputs, 0);
@@ -154,18 +150,15 @@ void open_session() {
     std::string revision(255, ' ');
     std::string second(255, ' ');
     status = ost7720_revision_query(session, revision.data(), second.data());
-    if (status != 0)
-        report_driver_error("ost7720_revision_query", status);
+    driver_ok("ost7720_revision_query");
     driver_revision = rtrim_blanks(revision.substr(0, revision.find('\0')));
 
     status = ost7720_deleteAllChanGroups(session);
-    if (status != 0)
-        report_driver_error("ost7720_deleteAllChanGroups", status);
+    driver_ok("ost7720_deleteAllChanGroups");
 
     auto create = [](int32_t count, const std::vector<int32_t>& ids, int32_t& group) {
         status = ost7720_createChannelGroup(session, count, ids.data(), &group);
-        if (status != 0)
-            report_driver_error("ost7720_createChannelGroup", status);
+        driver_ok("ost7720_createChannelGroup");
     };
     create(num_inputs, input_ids, group_inputs);
     create(num_sources, source_ids, group_sources);

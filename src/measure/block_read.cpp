@@ -6,14 +6,11 @@
 #include "core/shutdown.h"
 #include "measure/measurement.h"
 #include "ost7720.h"
+#include "ost7720_codes.h"
 
 namespace {
 
-constexpr int32_t kind_time = 270;
-constexpr int32_t kind_frequency = 271;
-constexpr int32_t type_time = 345;
-constexpr int32_t type_frequency = 346;
-constexpr int32_t enable_on = 280;
+namespace code = ost7720_code;
 
 // Received data for channels no trace shows; kept between blocks so the read does not
 // allocate each time. Its contents are never looked at.
@@ -36,8 +33,8 @@ void copy_trace(int from, int to, int32_t n) {
 void read_block() {
     using namespace global;
     const bool frequency = domain == 1;
-    const int32_t kind = frequency ? kind_frequency : kind_time;
-    const int32_t data_type = frequency ? type_frequency : type_time;
+    const int32_t kind = frequency ? code::kind_frequency : code::kind_time;
+    const int32_t data_type = frequency ? code::read_frequency : code::read_time;
     const int32_t points = std::max(num_points, 0);
     // Half the points for a spectrum, an exact half going to the even neighbour.
     const auto n = static_cast<int32_t>(frequency ? std::nearbyint(points / 2.0) : points);
@@ -53,9 +50,8 @@ void read_block() {
         const int32_t id = input_ids[c];
         int32_t state = 0;
         status = ost7720_getEnable(session, id, kind, &state);
-        if (status != 0)
-            report_driver_error("ost7720_getEnable", status);
-        if (state != enable_on)
+        driver_ok("ost7720_getEnable");
+        if (state != code::enable_on)
             continue;
 
         const auto shown = std::find(trace_channel.begin(), trace_channel.begin() + 4, id);
@@ -63,14 +59,12 @@ void read_block() {
         std::vector<double>& target = t < 4 ? trace_data(t) : scratch();
         int32_t count = 0;
         status = ost7720_readFloat64Data(session, id, data_type, target.data(), n, &count, 1);
-        if (status != 0)
-            report_driver_error("ost7720_readFloat64Data", status);
+        driver_ok("ost7720_readFloat64Data");
         if (t < 4) {
             trace_has_data[t] = flag_true;
             double range = 0;
             status = ost7720_getRange(session, trace_channel[t], &range);
-            if (status != 0)
-                report_driver_error("ost7720_getRange", status);
+            driver_ok("ost7720_getRange");
             trace_range[t] = range;
         }
     }

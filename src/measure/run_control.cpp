@@ -83,8 +83,7 @@ void MainFrm::TriggerBtn_Click() {
     if (trigger_source != 1 || running != flag_true)
         return;
     status = ost7720_triggerMeasure(session, group_all, 0);
-    if (status != 0)
-        report_driver_error("ost7720_triggerMeasure", status);
+    driver_ok("ost7720_triggerMeasure");
     TriggerBtn->setEnabled(false);
 }
 
@@ -96,8 +95,7 @@ void MainFrm::stop_measurement() {
     TriggerBtn->setEnabled(false);
     if (group_all != 0) {
         status = ost7720_resetMeasure(session, group_all);
-        if (status != 0)
-            report_driver_error("ost7720_resetMeasure", status);
+        driver_ok("ost7720_resetMeasure");
     }
 }
 

@@ -6,10 +6,9 @@
 #include "core/shutdown.h"
 #include "measure/measurement.h"
 #include "ost7720.h"
+#include "ost7720_codes.h"
 
 namespace {
-
-constexpr int32_t trigger_on = 420;
 
 // True when some channel of the list (count entries) is set to trigger. Every channel is asked.
 bool any_set_to_trigger(const std::vector<int32_t>& ids, int32_t count) {
@@ -17,9 +16,8 @@ bool any_set_to_trigger(const std::vector<int32_t>& ids, int32_t count) {
     for (int32_t i = 0; i < count && static_cast<size_t>(i) < ids.size(); ++i) {
         int32_t state = 0;
         global::status = ost7720_getTriggerChannel(global::session, ids[i], &state);
-        if (global::status != 0)
-            report_driver_error("ost7720_getTriggerChannel", global::status);
-        if (state == trigger_on)
+        driver_ok("ost7720_getTriggerChannel");
+        if (state == ost7720_code::on)
             any = true;
     }
     return any;

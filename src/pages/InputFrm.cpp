@@ -15,22 +15,11 @@
 #include "core/windows.h"
 #include "display/page_layout.h"
 #include "ost7720.h"
+#include "ost7720_codes.h"
 
 namespace {
 
-// Driver codes of the input settings.
-constexpr int32_t coupling_ac = 100;
-constexpr int32_t coupling_dc = 101;
-constexpr int32_t filter_on = 615;
-constexpr int32_t filter_off = 616;
-constexpr int32_t slope_positive = 410;
-constexpr int32_t slope_negative = 411;
-constexpr int32_t trigger_mode_level = 414;
-constexpr int32_t trigger_mode_bound = 415;
-constexpr int32_t level_lower = 416;
-constexpr int32_t level_upper = 417;
-constexpr int32_t trigger_on = 420;
-constexpr int32_t trigger_off = 421;
+namespace code = ost7720_code;
 
 struct InputMode {
     const char* name;
@@ -51,11 +40,6 @@ constexpr double range_ceiling = 20.0;
 // longest list entries.
 constexpr const char* widest_field_texts[] = {"On Breakout Box", "Not Adjustable", "AC Coupling",
                                               "DC Coupling",     "Neg/Enter",      "MIC_200V"};
-
-void check(const char* name) {
-    if (global::status != 0)
-        report_driver_error(name, global::status);
-}
 
 QString qtext(const std::string& text) {
     return QString::fromStdString(text);
@@ -234,37 +218,37 @@ void InputFrm::load_controls() {
 
     int32_t coupling = 0;
     status = ost7720_getCoupling(session, channel, &coupling);
-    check("ost7720_getCoupling");
-    CoupCmbo->setEditText(coupling == coupling_ac ? QStringLiteral("AC Coupling")
-                                                  : QStringLiteral("DC Coupling"));
+    driver_ok("ost7720_getCoupling");
+    CoupCmbo->setEditText(coupling == code::coupling_ac ? QStringLiteral("AC Coupling")
+                                                        : QStringLiteral("DC Coupling"));
 
     int32_t filter = 0;
     status = ost7720_getAntiAliasDigital(session, channel, &filter);
-    check("ost7720_getAntiAliasDigital");
-    DAACmbo->setEditText(filter == filter_on ? QStringLiteral("ON") : QStringLiteral("OFF"));
+    driver_ok("ost7720_getAntiAliasDigital");
+    DAACmbo->setEditText(filter == code::anti_alias_on ? QStringLiteral("ON") : QStringLiteral("OFF"));
 
     double range = 0;
     status = ost7720_getRange(session, channel, &range);
-    check("ost7720_getRange");
+    driver_ok("ost7720_getRange");
     RangeTxt->setText(qtext(numtext::text(range)));
 
     int32_t trigger = 0;
     status = ost7720_getTriggerChannel(session, channel, &trigger);
-    check("ost7720_getTriggerChannel");
-    TrigOnCmbo->setEditText(trigger == trigger_off ? QStringLiteral("OFF") : QStringLiteral("ON"));
+    driver_ok("ost7720_getTriggerChannel");
+    TrigOnCmbo->setEditText(trigger == code::off ? QStringLiteral("OFF") : QStringLiteral("ON"));
 
     double lower = 0;
     double upper = 0;
-    status = ost7720_getTriggerLevel(session, channel, level_lower, &lower);
-    check("ost7720_getTriggerLevel");
-    status = ost7720_getTriggerLevel(session, channel, level_upper, &upper);
-    check("ost7720_getTriggerLevel");
+    status = ost7720_getTriggerLevel(session, channel, code::level_lower, &lower);
+    driver_ok("ost7720_getTriggerLevel");
+    status = ost7720_getTriggerLevel(session, channel, code::level_upper, &upper);
+    driver_ok("ost7720_getTriggerLevel");
 
     // The level shown is the one the slope fires at; the hysteresis is the distance to the other.
     int32_t slope = 0;
     status = ost7720_getTriggerSlope(session, channel, &slope);
-    check("ost7720_getTriggerSlope");
-    if (slope == slope_positive) {
+    driver_ok("ost7720_getTriggerSlope");
+    if (slope == code::slope_positive) {
         TrigDirCmbo->setEditText(QStringLiteral("Pos/Exit"));
         TrigLvlTxt->setText(qtext(numtext::str(upper)));
     } else {
@@ -275,12 +259,13 @@ void InputFrm::load_controls() {
 
     int32_t mode = 0;
     status = ost7720_getTriggerMode(session, channel, &mode);
-    check("ost7720_getTriggerMode");
-    TrigModeCmbo->setEditText(mode == trigger_mode_level ? QStringLiteral("Level") : QStringLiteral("Bound"));
+    driver_ok("ost7720_getTriggerMode");
+    TrigModeCmbo->setEditText(mode == code::trigger_level ? QStringLiteral("Level")
+                                                          : QStringLiteral("Bound"));
 
     int32_t input_mode = 0;
     status = ost7720_getInputMode(session, channel, &input_mode);
-    check("ost7720_getInputMode");
+    driver_ok("ost7720_getInputMode");
     // A mode the page has no name for leaves the text as it was.
     for (const InputMode& m : input_modes)
         if (m.code == input_mode)
@@ -310,24 +295,25 @@ void InputFrm::doneBtn_Click() {
 
     const double range = std::clamp(numtext::val(RangeTxt->text().toStdString()), range_floor, range_ceiling);
     status = ost7720_setRange(session, target, range);
-    check("ost7720_setRange");
+    driver_ok("ost7720_setRange");
 
     status = ost7720_setCoupling(
         session, target,
-        CoupCmbo->currentText() == QStringLiteral("AC Coupling") ? coupling_ac : coupling_dc);
-    check("ost7720_setCoupling");
+        CoupCmbo->currentText() == QStringLiteral("AC Coupling") ? code::coupling_ac : code::coupling_dc);
+    driver_ok("ost7720_setCoupling");
 
     const bool filter = DAACmbo->currentText().compare(QStringLiteral("ON"), Qt::CaseInsensitive) == 0;
-    status = ost7720_setAntiAliasDigital(session, target, filter ? filter_on : filter_off);
-    check("ost7720_setAntiAliasDigital");
+    status =
+        ost7720_setAntiAliasDigital(session, target, filter ? code::anti_alias_on : code::anti_alias_off);
+    driver_ok("ost7720_setAntiAliasDigital");
 
     const bool positive = TrigDirCmbo->currentText() == QStringLiteral("Pos/Exit");
-    status = ost7720_setTriggerSlope(session, target, positive ? slope_positive : slope_negative);
-    check("ost7720_setTriggerSlope");
+    status = ost7720_setTriggerSlope(session, target, positive ? code::slope_positive : code::slope_negative);
+    driver_ok("ost7720_setTriggerSlope");
 
     status = ost7720_setTriggerChannel(
-        session, target, TrigOnCmbo->currentText() == QStringLiteral("OFF") ? trigger_off : trigger_on);
-    check("ost7720_setTriggerChannel");
+        session, target, TrigOnCmbo->currentText() == QStringLiteral("OFF") ? code::off : code::on);
+    driver_ok("ost7720_setTriggerChannel");
 
     // A mode text that names no mode is not sent: any code chosen for it could be the wrong
     // mode for the sensor on the channel. The channel keeps the mode it has.
@@ -335,24 +321,24 @@ void InputFrm::doneBtn_Click() {
     for (const InputMode& m : input_modes) {
         if (mode_text == m.name) {
             status = ost7720_setInputMode(session, target, m.code);
-            check("ost7720_setInputMode");
+            driver_ok("ost7720_setInputMode");
             break;
         }
     }
 
     status = ost7720_setTriggerMode(
         session, target,
-        TrigModeCmbo->currentText() == QStringLiteral("Level") ? trigger_mode_level : trigger_mode_bound);
-    check("ost7720_setTriggerMode");
+        TrigModeCmbo->currentText() == QStringLiteral("Level") ? code::trigger_level : code::trigger_bound);
+    driver_ok("ost7720_setTriggerMode");
 
     const double level = numtext::val(TrigLvlTxt->text().toStdString());
     const double hysteresis = numtext::val(HystTxt->text().toStdString());
     const double lower = positive ? level - hysteresis : level;
     const double upper = positive ? level : level + hysteresis;
-    status = ost7720_setTriggerLevel(session, target, level_lower, lower);
-    check("ost7720_setTriggerLevel");
-    status = ost7720_setTriggerLevel(session, target, level_upper, upper);
-    check("ost7720_setTriggerLevel");
+    status = ost7720_setTriggerLevel(session, target, code::level_lower, lower);
+    driver_ok("ost7720_setTriggerLevel");
+    status = ost7720_setTriggerLevel(session, target, code::level_upper, upper);
+    driver_ok("ost7720_setTriggerLevel");
 
     switch_page(*this, forms::main_form());
 }

@@ -20,14 +20,6 @@
 
 namespace {
 
-// After a driver call whose result is in global::status: reports a failure; true on success.
-bool call_ok(const char* name) {
-    if (global::status == 0)
-        return true;
-    report_driver_error(name, global::status);
-    return false;
-}
-
 QString number_text(double value) {
     return QString::fromStdString(numtext::text(value));
 }
@@ -201,18 +193,18 @@ void SrcFrm::load_controls() {
     int32_t code = 0;
 
     status = ost7720_getTriggerChannel(session, channel, &code);
-    if (call_ok("ost7720_getTriggerChannel"))
+    if (driver_ok("ost7720_getTriggerChannel"))
         SrcTrigCmbo->setEditText(code == srccode::off ? QStringLiteral("Off") : QStringLiteral("On"));
 
     status = ost7720_getSourceMode(session, channel, &code);
-    if (call_ok("ost7720_getSourceMode")) {
+    if (driver_ok("ost7720_getSourceMode")) {
         const int32_t i = code - srccode::first_mode;
         if (i >= 0 && i < static_cast<int32_t>(srccode::mode_names.size()))
             ModeCmbo->setEditText(QString::fromUtf8(srccode::mode_names[static_cast<size_t>(i)]));
     }
 
     status = ost7720_getSourceOutput(session, channel, &code);
-    if (call_ok("ost7720_getSourceOutput")) {
+    if (driver_ok("ost7720_getSourceOutput")) {
         const int32_t i = code - srccode::first_output;
         if (i >= 0 && i < static_cast<int32_t>(srccode::output_names.size()))
             OutputCmbo->setEditText(QString::fromUtf8(srccode::output_names[static_cast<size_t>(i)]));
@@ -221,7 +213,7 @@ void SrcFrm::load_controls() {
     }
 
     status = ost7720_getSourceCola(session, channel, &code);
-    if (call_ok("ost7720_getSourceCola")) {
+    if (driver_ok("ost7720_getSourceCola")) {
         if (code == srccode::cola_on)
             ColaCmbo->setEditText(QStringLiteral("On"));
         if (code == srccode::cola_off)
@@ -229,7 +221,7 @@ void SrcFrm::load_controls() {
     }
 
     status = ost7720_getSourceSum(session, channel, &code);
-    if (call_ok("ost7720_getSourceSum")) {
+    if (driver_ok("ost7720_getSourceSum")) {
         if (code == srccode::sum_on)
             SumCmbo->setEditText(QStringLiteral("On"));
         if (code == srccode::sum_off)
@@ -237,7 +229,7 @@ void SrcFrm::load_controls() {
     }
 
     status = ost7720_getActive(session, channel, &code);
-    if (call_ok("ost7720_getActive")) {
+    if (driver_ok("ost7720_getActive")) {
         ActiveCmbo->setEditText(code == srccode::on ? QStringLiteral("On") : QStringLiteral("Off"));
         if (code != srccode::on)
             hints.push_back("Active -> On");
@@ -245,37 +237,37 @@ void SrcFrm::load_controls() {
 
     double value = 0;
     status = ost7720_getRampRate(session, channel, &value);
-    if (call_ok("ost7720_getRampRate")) {
+    if (driver_ok("ost7720_getRampRate")) {
         RampRateTxt->setText(number_text(value));
         if (value > 0)
             hints.push_back("RampRate -> 0");
     }
 
     status = ost7720_getRange(session, channel, &value);
-    if (call_ok("ost7720_getRange")) {
+    if (driver_ok("ost7720_getRange")) {
         RangeTxt->setText(number_text(value));
         if (value < 1.0)
             hints.push_back("Range -> higher");
     }
 
     status = ost7720_getSineFreq(session, channel, &value);
-    if (call_ok("ost7720_getSineFreq")) {
+    if (driver_ok("ost7720_getSineFreq")) {
         FreqTxt->setText(number_text(value));
         if (value < 100.0)
             hints.push_back("Freq -> higher");
     }
 
     status = ost7720_getSinePhase(session, channel, &value);
-    if (call_ok("ost7720_getSinePhase"))
+    if (driver_ok("ost7720_getSinePhase"))
         PhaseTxt->setText(number_text(value));
 
     int32_t seed = 0;
     status = ost7720_getSourceSeed(session, channel, &seed);
-    if (call_ok("ost7720_getSourceSeed"))
+    if (driver_ok("ost7720_getSourceSeed"))
         SeedTxt->setText(number_text(seed));
 
     status = ost7720_getDutyCycle(session, channel, &value);
-    if (call_ok("ost7720_getDutyCycle")) {
+    if (driver_ok("ost7720_getDutyCycle")) {
         DutyTxt->setText(number_text(value));
         if (value < 0.5)
             hints.push_back("Duty Cycle -> 1");
@@ -337,7 +329,7 @@ void SrcFrm::PresetBtn_Click() {
     using namespace global;
     if (num_sources > 0 && cur_src >= 1 && cur_src <= num_sources) {
         status = ost7720_preset(session, source_ids[static_cast<size_t>(cur_src - 1)]);
-        call_ok("ost7720_preset");
+        driver_ok("ost7720_preset");
     }
     load_controls();
 }

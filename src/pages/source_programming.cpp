@@ -21,11 +21,6 @@ constexpr int32_t arb_buffer_mode = 4;
 constexpr int32_t arb_buffer_init = 1;
 constexpr int32_t arb_max_polls = 100000;
 
-void check(const char* name) {
-    if (global::status != 0)
-        report_driver_error(name, global::status);
-}
-
 // The code of text among names counted from first; nothing when the text is none of them.
 template <size_t N>
 std::optional<int32_t> code_of(const std::string& text, const std::array<const char*, N>& names,
@@ -56,15 +51,15 @@ std::string text_of(const QLineEdit* box) {
 void download_test_waveform(int32_t channel) {
     using namespace global;
     status = ost7720_setAmpScale(session, channel, 1.0);
-    check("ost7720_setAmpScale");
+    driver_ok("ost7720_setAmpScale");
     status = ost7720_setSourceBlocksize(session, channel, arb_table_points);
-    check("ost7720_setSourceBlocksize");
+    driver_ok("ost7720_setSourceBlocksize");
     status = ost7720_setSrcBufferSize(session, channel, arb_table_points);
-    check("ost7720_setSrcBufferSize");
+    driver_ok("ost7720_setSrcBufferSize");
     status = ost7720_setSrcBufferMode(session, channel, arb_buffer_mode);
-    check("ost7720_setSrcBufferMode");
+    driver_ok("ost7720_setSrcBufferMode");
     status = ost7720_setSrcBufferInit(session, channel, arb_buffer_init);
-    check("ost7720_setSrcBufferInit");
+    driver_ok("ost7720_setSrcBufferInit");
 
     const std::array<int32_t, arb_table_points> table = arb_test_waveform();
 
@@ -87,7 +82,7 @@ void download_test_waveform(int32_t channel) {
         return;
     }
     status = ost7720_writeSrcBufferData(session, channel, table.data(), arb_table_points, arb_buffer_mode);
-    check("ost7720_writeSrcBufferData");
+    driver_ok("ost7720_writeSrcBufferData");
 }
 
 }  // namespace
@@ -138,7 +133,7 @@ void SrcFrm::setupsource() {
     // 2. Active.
     if (std::optional<int32_t> code = active_code()) {
         status = ost7720_setActive(session, channel, *code);
-        check("ost7720_setActive");
+        driver_ok("ost7720_setActive");
     }
 
     // 3. Count the active sources.
@@ -146,7 +141,7 @@ void SrcFrm::setupsource() {
     for (int32_t i = 1; i <= num_sources; ++i) {
         int32_t state = 0;
         status = ost7720_getActive(session, source_ids[static_cast<size_t>(i - 1)], &state);
-        check("ost7720_getActive");
+        driver_ok("ost7720_getActive");
         if (state == srccode::on)
             ++active_sources;
     }
@@ -162,18 +157,18 @@ void SrcFrm::setupsource() {
             numtext::text(cur_src) + " is ON, all others are OFF");
         for (int32_t i = 1; i <= num_sources; ++i) {
             status = ost7720_setActive(session, source_ids[static_cast<size_t>(i - 1)], srccode::off);
-            check("ost7720_setActive");
+            driver_ok("ost7720_setActive");
         }
         if (std::optional<int32_t> code = active_code()) {
             status = ost7720_setActive(session, channel, *code);
-            check("ost7720_setActive");
+            driver_ok("ost7720_setActive");
         }
     }
 
     // 5. Trigger.
     if (std::optional<int32_t> code = on_off_code(text_of(SrcTrigCmbo), srccode::on, srccode::off)) {
         status = ost7720_setTriggerChannel(session, channel, *code);
-        check("ost7720_setTriggerChannel");
+        driver_ok("ost7720_setTriggerChannel");
     } else {
         dialogs::notice("bad trig active string");
     }
@@ -186,7 +181,7 @@ void SrcFrm::setupsource() {
         mode = srccode::first_mode;
     }
     status = ost7720_setSourceMode(session, channel, *mode);
-    check("ost7720_setSourceMode");
+    driver_ok("ost7720_setSourceMode");
 
     // 7. An active arbitrary source gets the test waveform.
     if (text_of(ActiveCmbo) == "On" &&
@@ -197,7 +192,7 @@ void SrcFrm::setupsource() {
     const std::string output_text = text_of(OutputCmbo);
     if (std::optional<int32_t> code = code_of(output_text, srccode::output_names, srccode::first_output)) {
         status = ost7720_setSourceOutput(session, channel, *code);
-        check("ost7720_setSourceOutput");
+        driver_ok("ost7720_setSourceOutput");
     } else {
         dialogs::notice("Unknown source output " + output_text + " - ignored");
     }
@@ -205,7 +200,7 @@ void SrcFrm::setupsource() {
     // 9. Sum.
     if (std::optional<int32_t> code = on_off_code(text_of(SumCmbo), srccode::sum_on, srccode::sum_off)) {
         status = ost7720_setSourceSum(session, channel, *code);
-        check("ost7720_setSourceSum");
+        driver_ok("ost7720_setSourceSum");
     } else {
         dialogs::notice("bad src sum string");
     }
@@ -213,7 +208,7 @@ void SrcFrm::setupsource() {
     // 10. Cola.
     if (std::optional<int32_t> code = on_off_code(text_of(ColaCmbo), srccode::cola_on, srccode::cola_off)) {
         status = ost7720_setSourceCola(session, channel, *code);
-        check("ost7720_setSourceCola");
+        driver_ok("ost7720_setSourceCola");
     } else {
         dialogs::notice("bad cola string");
     }
@@ -223,15 +218,15 @@ void SrcFrm::setupsource() {
         return source_limit(numtext::val(text_of(box)), lower, upper);
     };
     status = ost7720_setRampRate(session, channel, number(RampRateTxt, 0, 100));
-    check("ost7720_setRampRate");
+    driver_ok("ost7720_setRampRate");
     status = ost7720_setSineFreq(session, channel, number(FreqTxt, 0, 25600));
-    check("ost7720_setSineFreq");
+    driver_ok("ost7720_setSineFreq");
     status = ost7720_setSinePhase(session, channel, number(PhaseTxt, -360, 360));
-    check("ost7720_setSinePhase");
+    driver_ok("ost7720_setSinePhase");
     status = ost7720_setSourceSeed(session, channel, numtext::to_int32(number(SeedTxt, 0, 255)).value_or(0));
-    check("ost7720_setSourceSeed");
+    driver_ok("ost7720_setSourceSeed");
     status = ost7720_setRange(session, channel, number(RangeTxt, 0, 20));
-    check("ost7720_setRange");
+    driver_ok("ost7720_setRange");
     status = ost7720_setDutyCycle(session, channel, number(DutyTxt, 0, 1));
-    check("ost7720_setDutyCycle");
+    driver_ok("ost7720_setDutyCycle");
 }
