@@ -10,9 +10,11 @@
 
 #include <QColor>
 #include <QImage>
+#include <QLineF>
 #include <QPointF>
 #include <QWidget>
 #include <cstdint>
+#include <vector>
 
 class PictureBox : public QWidget {
     Q_OBJECT
@@ -33,9 +35,18 @@ class PictureBox : public QWidget {
     void line_to(double x, double y);
     void set_current(double x, double y);
 
+    // Several lines in one colour, each drawn as line() draws it; the last end becomes the
+    // current position.
+    void lines(const QLineF* list, int n, const QColor& color);
+
     // line_to through every point in order, in one pass over the image: the same pixels as n
     // line_to calls, at a fraction of the cost when many points share a pixel column.
     void polyline_to(const QPointF* points, int n);
+
+    // line_to through (xs[k], y_k) for k = 0 .. n - 1, where y_k is ys[k] raised to low and
+    // then lowered to high: the same pixels as those n calls. Samples that stay in one pixel
+    // column cost two comparisons each, which is what makes a long block cheap to draw.
+    void trace_to(const float* xs, const double* ys, int n, double low, double high);
 
     QColor background() const;
     QColor foreground() const;
@@ -53,12 +64,14 @@ class PictureBox : public QWidget {
 
   private:
     void ensure_image();
-    // Integer line between two device pixels, both ends included.
-    void segment(int32_t ax, int32_t ay, int32_t bx, int32_t by, QRgb color);
-    void column_run(int32_t x, int32_t y0, int32_t y1, QRgb color);
+    // The pixels and the integer rasteriser, for one drawing call.
+    struct Canvas;
+    Canvas canvas();
 
     QImage image_;
     double sx1_ = 0, sy1_ = 0, sx2_ = 1, sy2_ = 1;
     bool scale_ok_ = true;
     double cur_x_ = 0, cur_y_ = 0;
+    // Scratch of trace_to: where each pixel column begins along x for the scale of one call.
+    std::vector<double> column_edges_;
 };

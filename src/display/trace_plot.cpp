@@ -1,10 +1,10 @@
 #include "display/trace_plot.h"
 
 #include <QColor>
-#include <QPointF>
+#include <QLineF>
 #include <algorithm>
+#include <array>
 #include <cmath>
-#include <vector>
 
 namespace {
 
@@ -31,26 +31,24 @@ void plot_trace(PictureBox& picture, double x1, double y1, double w, double h, c
     if (!picture.scale_valid())
         return;
 
+    std::array<QLineF, 18> grid;
     for (int k = 0; k < 8; ++k) {
         const double y = yt - k * h / 8;
-        picture.line(xl, y, xr, y, grid_grey);
+        grid[k] = QLineF(xl, y, xr, y);
     }
     for (int k = 0; k < 10; ++k) {
         const double x = xl + k * w / 10;
-        picture.line(x, yt, x, yb, grid_grey);
+        grid[8 + k] = QLineF(x, yt, x, yb);
     }
+    picture.lines(grid.data(), static_cast<int>(grid.size()), grid_grey);
     if (n < 1 || xs == nullptr || ys == nullptr)
         return;
 
     // The visible range runs from yb up to yt; a scale set upside down (high below low) has
     // them the other way round, and its samples are kept inside it all the same.
     const double lo = std::min(yb, yt), hi = std::max(yb, yt);
-    static thread_local std::vector<QPointF> points;
-    points.resize(static_cast<size_t>(n));
-    for (int32_t k = 0; k < n; ++k)
-        points[k] = QPointF(xs[k], clamp_value(ys[k], lo, hi));
-    picture.set_current(points[0].x(), points[0].y());
-    picture.polyline_to(points.data(), n);
+    picture.set_current(xs[0], clamp_value(ys[0], lo, hi));
+    picture.trace_to(xs, ys, n, lo, hi);
 }
 
 void plot_trace(PictureBox& picture, double x1, double y1, double w, double h, std::span<const float> xs,
