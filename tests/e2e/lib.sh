@@ -315,6 +315,19 @@ disp_file() {
     e2e_type "$PAGE" 0.625 "$(awk -v i="$row" 'BEGIN { print (i + 2) / 7 }')" 40 10 "$text"
 }
 
+# The Input and Source pages place their fields on a grid: place i (0..15) has its top at
+# (1 + 2 (i mod 8)) / 18 of the height; a field's left is at 2/12 of the width for places 0..7
+# and at 7/12 for 8..15; the check box of place 0 at 1.5/12.
+grid_field() { # PLACE TEXT: types TEXT into the field at that place of $PAGE
+    local place=$1
+    e2e_type "$PAGE" "$(awk -v i="$place" 'BEGIN { print (i < 8 ? 2 : 7) / 12 }')" \
+        "$(awk -v i="$place" 'BEGIN { print (1 + 2 * (i % 8)) / 18 }')" 20 10 "$2"
+}
+
+grid_check_box() { # clicks the check box at place 0 of $PAGE
+    e2e_click "$PAGE" 0.125 0.0556 7 8
+}
+
 # e2e_shot WID FILE: the window's pixels as PNG.
 e2e_shot() {
     import -window "$1" "$2"
