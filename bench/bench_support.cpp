@@ -15,15 +15,15 @@ void Timings::ReportRuns(const std::vector<Run>& reports) {
     for (const Run& run : reports) {
         if (run.run_type != Run::RT_Iteration || run.error_occurred)
             continue;
-        const double per_iteration =
-            run.GetAdjustedRealTime() / benchmark::GetTimeUnitMultiplier(run.time_unit);
-        runs_[run.run_name.str()].push_back(per_iteration);
+        const double unit = benchmark::GetTimeUnitMultiplier(run.time_unit);
+        cpu_[run.run_name.str()].push_back(run.GetAdjustedCPUTime() / unit);
+        real_[run.run_name.str()].push_back(run.GetAdjustedRealTime() / unit);
     }
 }
 
-double Timings::seconds(const std::string& name) const {
-    const auto found = runs_.find(name);
-    if (found == runs_.end() || found->second.empty())
+double Timings::median(const Runs& runs, const std::string& name) {
+    const auto found = runs.find(name);
+    if (found == runs.end() || found->second.empty())
         return 0.0;
     std::vector<double> v = found->second;
     std::sort(v.begin(), v.end());

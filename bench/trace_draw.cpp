@@ -10,47 +10,16 @@
 #include "bench_support.h"
 #include "display/PictureBox.h"
 #include "display/trace_plot.h"
+#include "trace_blocks.h"
 
 namespace {
 
-constexpr int picture_width = 900;
-constexpr int picture_height = 150;
-constexpr double scale_high = 1.0;
-constexpr double scale_low = -1.0;
-constexpr std::array<int32_t, 3> sizes = {1024, 16384, 65536};
-
-// A few different blocks per size, drawn in turn, as a running measurement delivers them.
-struct Blocks {
-    std::vector<float> xs;
-    std::array<std::vector<double>, 4> ys;
-};
-
-const Blocks& blocks(int32_t n) {
-    static std::array<Blocks, sizes.size()> all;
-    for (size_t i = 0; i < sizes.size(); ++i) {
-        if (sizes[i] != n)
-            continue;
-        Blocks& b = all[i];
-        if (b.xs.empty()) {
-            b.xs = bench::sample_positions(n);
-            for (size_t s = 0; s < b.ys.size(); ++s)
-                b.ys[s] = bench::noisy_sine(n, static_cast<uint32_t>(1000 + 17 * s + n));
-        }
-        return b;
-    }
-    bench::fail("no block of " + std::to_string(n) + " samples");
-}
-
-PictureBox& picture() {
-    static PictureBox pic;
-    pic.resize(picture_width, picture_height);
-    return pic;
-}
-
-void draw_plot_trace(PictureBox& pic, const std::vector<float>& xs, const std::vector<double>& ys,
-                     int32_t n) {
-    plot_trace(pic, 0, scale_high, n, scale_high - scale_low, xs.data(), ys.data(), n);
-}
+using bench::Blocks;
+using bench::blocks;
+using bench::draw_plot_trace;
+using bench::picture;
+using bench::scale_high;
+using bench::scale_low;
 
 // The same scale, clearing and grid as plot_trace, then one line_to per sample.
 void draw_per_segment(PictureBox& pic, const std::vector<float>& xs, const std::vector<double>& ys,
@@ -100,14 +69,14 @@ BENCHMARK(BM_per_segment)->Arg(1024)->Arg(16384)->Arg(65536)->Unit(benchmark::kM
 // Every block of every size, drawn both ways, gives the same image.
 void check_same_pixels() {
     PictureBox& pic = picture();
-    for (int32_t n : sizes) {
+    for (int32_t n : bench::block_sizes) {
         const Blocks& b = blocks(n);
         for (size_t s = 0; s < b.ys.size(); ++s) {
             draw_plot_trace(pic, b.xs, b.ys[s], n);
             const QImage fast = pic.image().copy();
             draw_per_segment(pic, b.xs, b.ys[s], n);
             const QImage& reference = pic.image();
-            if (fast.size() != QSize(picture_width, picture_height) || fast != reference)
+            if (fast.size() != QSize(bench::picture_width, bench::picture_height) || fast != reference)
                 bench::fail("plot_trace and per-segment drawing differ for n = " + std::to_string(n));
         }
     }
@@ -122,7 +91,7 @@ int main(int argc, char** argv) {
     bench::Timings timings;
     if (!bench::run_all(argc, argv, timings))
         return 1;
-    for (int32_t n : sizes) {
+    for (int32_t n : bench::block_sizes) {
         const std::string arg = "/" + std::to_string(n);
         const double fast = timings.seconds("BM_plot_trace" + arg);
         const double slow = timings.seconds("BM_per_segment" + arg);
