@@ -1,167 +1,106 @@
 // The Input Setup page: what it reads when shown, what OK sends to one channel or to all inputs,
-// the refusals, checked against the simulator's call log and the settings it keeps.
+// and the refusals, checked against the simulator's call log and the settings it keeps.
 #include <gtest/gtest.h>
 
-#include <QTest>
-#include <string>
-#include <vector>
-
-#include "core/global.h"
-#include "core/windows.h"
-#include "display/MainFrm.h"
 #include "ost7720.h"
-#include "page_readability.h"
+#include "page_fixture.h"
 #include "pages/InputFrm.h"
-#include "panel_fixture.h"
 
 namespace {
 
-using Texts = std::vector<std::string>;
+// What OK sends for the page as first shown: 2 V, DC, filter on, Pos/Exit, trigger off, VOLT,
+// Level, lower and upper level 5 % and 10 %.
+const Texts sent_first = {"2", "101", "615", "410", "421", "130", "414", "416, 5", "417, 10"};
+const Texts shown_first = {"ALL", "2", "DC Coupling", "ON", "OFF", "Level", "Pos/Exit", " 10", " 5", "VOLT"};
 
-// What one input channel holds in the simulator.
-struct Held {
-    double range = 0;
-    int32_t coupling = 0;
-    int32_t filter = 0;
-    int32_t slope = 0;
-    int32_t trigger = 0;
-    int32_t input_mode = 0;
-    int32_t trigger_mode = 0;
-    double lower = 0;
-    double upper = 0;
-};
-
-class InputFrmTest : public PanelTest {
+class InputFrmTest : public PageTest {
   protected:
-    void SetUp() override {
-        PanelTest::SetUp();
-        main().Form_Load();
-        sim::clear_call_log();
+    InputFrm& open() {
+        main().InpBtn_Click();
+        return forms::get<InputFrm>();
     }
+    std::string group() const { return std::to_string(global::group_inputs); }
 
-    MainFrm& main() { return forms::get<MainFrm>(); }
-    InputFrm& page() { return forms::get<InputFrm>(); }
-
-    // As the main window's Input button does.
-    InputFrm& open_page() {
-        switch_page(main(), page());
-        return page();
-    }
-
-    static void type(QComboBox* box, const char* text) {
-        box->lineEdit()->clear();
-        QTest::keyClicks(box->lineEdit(), QString::fromUtf8(text));
-    }
-    static void type(QLineEdit* box, const char* text) {
-        box->clear();
-        QTest::keyClicks(box, QString::fromUtf8(text));
-    }
-    static void click(QAbstractButton* b) { QTest::mouseClick(b, Qt::LeftButton); }
-    static std::string text(const QComboBox* box) { return box->currentText().toStdString(); }
-    static std::string text(const QLineEdit* box) { return box->text().toStdString(); }
-
-    // The calls whose name starts with prefix ("ost7720_set", "ost7720_get") since the log was
-    // last cleared, as "setRange(target, value)": every one must carry the panel's session.
-    static Texts calls(const std::string& prefix) {
+    // The nine set calls of OK, in order, to target with these values; an empty value: no call.
+    static Texts nine(const std::string& target, const Texts& values) {
+        static const char* const names[] = {"setRange",        "setCoupling",       "setAntiAliasDigital",
+                                            "setTriggerSlope", "setTriggerChannel", "setInputMode",
+                                            "setTriggerMode",  "setTriggerLevel",   "setTriggerLevel"};
         Texts out;
-        for (const sim::Call& c : sim::call_log()) {
-            if (c.name.rfind(prefix, 0) != 0)
-                continue;
-            EXPECT_EQ(c.args.at(0), std::to_string(global::session)) << c.line();
-            std::string line = c.name.substr(8) + "(";
-            for (size_t i = 1; i < c.args.size(); ++i)
-                line += (i > 1 ? ", " : "") + c.args[i];
-            out.push_back(line + ")");
-        }
+        for (size_t i = 0; i < 9; ++i)
+            if (!values[i].empty())
+                out.push_back(names[i] + ("(" + target + ", ") + values[i] + ")");
         return out;
     }
-    static Texts sent() { return calls("ost7720_set"); }
 
-    // The set calls of OK with a given page text, as sent to target.
-    Texts ok_with(QComboBox* box, const char* typed) {
-        open_page();
+    // The set calls of OK after typing into one box of the page.
+    Texts ok_with(QLineEdit* box, const char* typed) {
+        InputFrm& p = open();
         type(box, typed);
         sim::clear_call_log();
-        click(page().doneBtn);
-        return sent();
+        click(p.doneBtn);
+        return calls({"set"});
     }
 
-    static Held held(int32_t channel) {
-        Held h;
+    // What a channel holds, in the order of the nine set calls.
+    static std::vector<double> held(int32_t ch) {
         const int32_t s = global::session;
-        EXPECT_EQ(ost7720_getRange(s, channel, &h.range), 0);
-        EXPECT_EQ(ost7720_getCoupling(s, channel, &h.coupling), 0);
-        EXPECT_EQ(ost7720_getAntiAliasDigital(s, channel, &h.filter), 0);
-        EXPECT_EQ(ost7720_getTriggerSlope(s, channel, &h.slope), 0);
-        EXPECT_EQ(ost7720_getTriggerChannel(s, channel, &h.trigger), 0);
-        EXPECT_EQ(ost7720_getInputMode(s, channel, &h.input_mode), 0);
-        EXPECT_EQ(ost7720_getTriggerMode(s, channel, &h.trigger_mode), 0);
-        EXPECT_EQ(ost7720_getTriggerLevel(s, channel, 416, &h.lower), 0);
-        EXPECT_EQ(ost7720_getTriggerLevel(s, channel, 417, &h.upper), 0);
-        return h;
+        double range = 0, lower = 0, upper = 0;
+        int32_t coupling = 0, filter = 0, slope = 0, trigger = 0, mode = 0, trigger_mode = 0;
+        EXPECT_EQ(ost7720_getRange(s, ch, &range) | ost7720_getCoupling(s, ch, &coupling) |
+                      ost7720_getAntiAliasDigital(s, ch, &filter) | ost7720_getTriggerSlope(s, ch, &slope) |
+                      ost7720_getTriggerChannel(s, ch, &trigger) | ost7720_getInputMode(s, ch, &mode) |
+                      ost7720_getTriggerMode(s, ch, &trigger_mode) |
+                      ost7720_getTriggerLevel(s, ch, 416, &lower) |
+                      ost7720_getTriggerLevel(s, ch, 417, &upper),
+                  0);
+        return {range,        double(coupling),     double(filter), double(slope), double(trigger),
+                double(mode), double(trigger_mode), lower,          upper};
     }
 
-    std::string group() const { return std::to_string(global::group_inputs); }
+    static Texts fields(const InputFrm& p) {
+        return {text(p.ChnNumCmbo), text(p.RangeTxt),     text(p.CoupCmbo),    text(p.DAACmbo),
+                text(p.TrigOnCmbo), text(p.TrigModeCmbo), text(p.TrigDirCmbo), text(p.TrigLvlTxt),
+                text(p.HystTxt),    text(p.inpmodeCmbo)};
+    }
 };
 
-TEST_F(InputFrmTest, FirstOpeningReadsChannelOneAndShowsAll) {
-    InputFrm& p = page();
-    EXPECT_EQ(p.cur_chan, 1);
-    EXPECT_EQ(text(p.inpmodeCmbo), "Combo1");
-    open_page();
-    EXPECT_EQ(p.windowTitle().toStdString(), "Input Setup");
-    EXPECT_TRUE(p.isVisible());
+TEST_F(InputFrmTest, FirstOpeningReadsChannelOneShowsAllCancelSendsNothingOkSendsToTheGroup) {
+    InputFrm& p = open();
     EXPECT_FALSE(main().isVisible());
-
-    // Channel 1 at power-on: 2 V, DC, filter on, trigger off, Pos/Exit at 5 % / 10 %, Level, VOLT.
-    EXPECT_EQ(calls("ost7720_get"),
+    EXPECT_EQ(calls({"get", "set"}),
               (Texts{"getCoupling(1)", "getAntiAliasDigital(1)", "getRange(1)", "getTriggerChannel(1)",
                      "getTriggerLevel(1, 416)", "getTriggerLevel(1, 417)", "getTriggerSlope(1)",
                      "getTriggerMode(1)", "getInputMode(1)"}));
-    EXPECT_TRUE(sent().empty());
     EXPECT_TRUE(p.AllSameChk->isChecked());
     EXPECT_EQ(p.AllSameChk->text().toStdString(), "All Channels Identical");
-    EXPECT_EQ(text(p.ChnNumCmbo), "ALL");
     EXPECT_FALSE(p.ChnNumCmbo->isEnabled());
-    ASSERT_EQ(p.ChnNumCmbo->count(), 16);
-    EXPECT_EQ(p.ChnNumCmbo->itemText(0).toStdString(), "1");
-    EXPECT_EQ(p.ChnNumCmbo->itemText(15).toStdString(), "16");
-    EXPECT_EQ(text(p.RangeTxt), "2");
-    EXPECT_EQ(text(p.CoupCmbo), "DC Coupling");
-    EXPECT_EQ(text(p.DAACmbo), "ON");
-    EXPECT_EQ(text(p.TrigOnCmbo), "OFF");
-    EXPECT_EQ(text(p.TrigDirCmbo), "Pos/Exit");
-    EXPECT_EQ(text(p.TrigLvlTxt), " 10");
-    EXPECT_EQ(text(p.HystTxt), " 5");
-    EXPECT_EQ(text(p.TrigModeCmbo), "Level");
-    EXPECT_EQ(text(p.inpmodeCmbo), "VOLT");
+    EXPECT_EQ(items(p.ChnNumCmbo).size(), 16u);
+    EXPECT_EQ(fields(p), shown_first);
+    // The two boxes the page never reads keep their fixed texts, disabled.
     EXPECT_EQ(text(p.GndCmbo), "On Breakout Box");
     EXPECT_EQ(text(p.AAACmbo), "Not Adjustable");
-    EXPECT_FALSE(p.GndCmbo->isEnabled());
-    EXPECT_FALSE(p.AAACmbo->isEnabled());
-    EXPECT_EQ(p.DAALbl->text().toStdString(), "Digital  Anti Alias");
-    EXPECT_EQ(p.AAALbl->text().toStdString(), "Analog  Anti Alias");
-    EXPECT_TRUE(messages.empty());
-}
+    EXPECT_FALSE(p.GndCmbo->isEnabled() || p.AAACmbo->isEnabled());
+    EXPECT_EQ(text(p.DAALbl), "Digital  Anti Alias");
+    EXPECT_EQ(text(p.AAALbl), "Analog  Anti Alias");
 
-TEST_F(InputFrmTest, OkSendsEveryCallToTheGroupOfInputs) {
-    InputFrm& p = open_page();
+    type(p.RangeTxt, "5");
+    type(p.inpmodeCmbo, "MIC");
+    sim::clear_call_log();
+    click(p.cancelBtn);
+    EXPECT_TRUE(main().isVisible());
+    EXPECT_TRUE(sim::call_log().empty());
+    EXPECT_EQ(fields(open()), shown_first);
+
     sim::clear_call_log();
     click(p.doneBtn);
-    const std::string g = group();
-    EXPECT_EQ(sent(), (Texts{"setRange(" + g + ", 2)", "setCoupling(" + g + ", 101)",
-                             "setAntiAliasDigital(" + g + ", 615)", "setTriggerSlope(" + g + ", 410)",
-                             "setTriggerChannel(" + g + ", 421)", "setInputMode(" + g + ", 130)",
-                             "setTriggerMode(" + g + ", 414)", "setTriggerLevel(" + g + ", 416, 5)",
-                             "setTriggerLevel(" + g + ", 417, 10)"}));
-    EXPECT_TRUE(messages.empty());
-    EXPECT_FALSE(p.isVisible());
+    EXPECT_EQ(calls({"set"}), nine(group(), sent_first));
     EXPECT_TRUE(main().isVisible());
-    EXPECT_TRUE(main().isEnabled());
+    EXPECT_TRUE(messages.empty());
 }
 
 TEST_F(InputFrmTest, NewSettingsReachEveryInputAndShowOnReopening) {
-    InputFrm& p = open_page();
+    InputFrm& p = open();
     type(p.RangeTxt, "0.5");
     type(p.CoupCmbo, "AC Coupling");
     type(p.DAACmbo, "Off");
@@ -173,108 +112,89 @@ TEST_F(InputFrmTest, NewSettingsReachEveryInputAndShowOnReopening) {
     type(p.inpmodeCmbo, "ICP");
     click(p.doneBtn);
     EXPECT_TRUE(messages.empty());
-
-    for (int32_t channel : {1, 9, 16}) {
-        SCOPED_TRACE(channel);
-        const Held h = held(channel);
-        EXPECT_EQ(h.range, 0.5);
-        EXPECT_EQ(h.coupling, 100);
-        EXPECT_EQ(h.filter, 616);
-        EXPECT_EQ(h.trigger, 420);
-        EXPECT_EQ(h.trigger_mode, 415);
-        EXPECT_EQ(h.slope, 411);
-        EXPECT_EQ(h.input_mode, 131);
-        EXPECT_EQ(h.lower, -20.0);
-        EXPECT_EQ(h.upper, -5.0);
-    }
-
-    open_page();
-    EXPECT_EQ(text(p.RangeTxt), ".5");
-    EXPECT_EQ(text(p.CoupCmbo), "AC Coupling");
-    EXPECT_EQ(text(p.DAACmbo), "OFF");
-    EXPECT_EQ(text(p.TrigOnCmbo), "ON");
-    EXPECT_EQ(text(p.TrigModeCmbo), "Bound");
-    EXPECT_EQ(text(p.TrigDirCmbo), "Neg/Enter");
-    EXPECT_EQ(text(p.TrigLvlTxt), "-20");  // a negative slope fires at the lower level
-    EXPECT_EQ(text(p.HystTxt), " 15");
-    EXPECT_EQ(text(p.inpmodeCmbo), "ICP");
+    for (int32_t channel : {1, 16})
+        EXPECT_EQ(held(channel), (std::vector<double>{0.5, 100, 616, 411, 420, 131, 415, -20, -5}))
+            << channel;
+    // A negative slope fires at the lower level.
+    EXPECT_EQ(fields(open()),
+              (Texts{"ALL", ".5", "AC Coupling", "OFF", "ON", "Bound", "Neg/Enter", "-20", " 15", "ICP"}));
 }
 
 TEST_F(InputFrmTest, OneChannelAtATimeWhenTheBoxIsCleared) {
-    InputFrm& p = open_page();
-    // Channel 1 differs from the others, so the reload shows where it read.
-    ASSERT_EQ(ost7720_setRange(global::session, 1, 5), 0);
+    InputFrm& p = open();
     sim::clear_call_log();
-
     click(p.AllSameChk);
     EXPECT_EQ(global::all_channels_match, global::flag_false);
-    EXPECT_FALSE(p.AllSameChk->isChecked());
-    EXPECT_EQ(text(p.ChnNumCmbo), "1");
     EXPECT_TRUE(p.ChnNumCmbo->isEnabled());
-    EXPECT_EQ(text(p.RangeTxt), "5");
-    EXPECT_EQ(calls("ost7720_get"),
-              (Texts{"getCoupling(1)", "getAntiAliasDigital(1)", "getRange(1)", "getTriggerChannel(1)",
-                     "getTriggerLevel(1, 416)", "getTriggerLevel(1, 417)", "getTriggerSlope(1)",
-                     "getTriggerMode(1)", "getInputMode(1)"}));
+    EXPECT_EQ(text(p.ChnNumCmbo), "1");
+    EXPECT_EQ(calls({"get"}).size(), 9u);
 
-    // Another number in the box reads nothing: OK writes the page's values to that channel.
+    // Another number reads nothing: OK writes the page's values to that channel.
     sim::clear_call_log();
     type(p.ChnNumCmbo, "3");
     EXPECT_TRUE(sim::call_log().empty());
-    type(p.RangeTxt, "10");
     type(p.inpmodeCmbo, "MIC");
     click(p.doneBtn);
-    EXPECT_EQ(p.cur_chan, 3);
-    EXPECT_EQ(sent(),
-              (Texts{"setRange(3, 10)", "setCoupling(3, 101)", "setAntiAliasDigital(3, 615)",
-                     "setTriggerSlope(3, 410)", "setTriggerChannel(3, 421)", "setInputMode(3, 133)",
-                     "setTriggerMode(3, 414)", "setTriggerLevel(3, 416, 5)", "setTriggerLevel(3, 417, 10)"}));
-    EXPECT_EQ(held(3).range, 10.0);
-    EXPECT_EQ(held(3).input_mode, 133);
-    EXPECT_EQ(held(1).range, 5.0);
-    EXPECT_EQ(held(4).range, 2.0);
+    Texts values = sent_first;
+    values[5] = "133";
+    EXPECT_EQ(calls({"set"}), nine("3", values));
+    EXPECT_EQ(held(4)[5], 130);
 
-    // Reopening shows the channel last confirmed, read from the module.
+    // Reopening reads the channel last confirmed: mode 133 shows as "MIC".
     sim::clear_call_log();
-    open_page();
+    open();
     EXPECT_EQ(text(p.ChnNumCmbo), "3");
-    EXPECT_EQ(text(p.RangeTxt), "10");
     EXPECT_EQ(text(p.inpmodeCmbo), "MIC");
-    EXPECT_EQ(calls("ost7720_get").front(), "getCoupling(3)");
-    EXPECT_EQ(calls("ost7720_get").back(), "getInputMode(3)");
-
-    // Checking the box again goes back to all inputs, read from channel 1.
+    EXPECT_EQ(calls({"get"}).front(), "getCoupling(3)");
+    // Checked again: all inputs, read from channel 1.
     click(p.AllSameChk);
-    EXPECT_EQ(global::all_channels_match, global::flag_true);
-    EXPECT_EQ(text(p.ChnNumCmbo), "ALL");
-    EXPECT_FALSE(p.ChnNumCmbo->isEnabled());
-    EXPECT_EQ(text(p.RangeTxt), "5");
-    EXPECT_EQ(p.cur_chan, 3);
+    EXPECT_EQ(fields(p), shown_first);
 }
 
-TEST_F(InputFrmTest, RangeIsLimitedToZeroToTwentyBeforeItIsSent) {
+TEST_F(InputFrmTest, TypedTextsBecomeCodesAndLimitedRanges) {
+    InputFrm& p = forms::get<InputFrm>();
     struct Case {
+        QLineEdit* box;
         const char* typed;
+        size_t call;  // among the nine set calls
         const char* sent;
     };
-    // The module takes at most 10 V: 20 goes out and is refused, the others are coerced.
-    for (const Case& c : {Case{"25", "20"}, Case{"-3", "0"}, Case{" 7.5 V", "7.5"}, Case{"volts", "0"}}) {
-        SCOPED_TRACE(c.typed);
-        messages.clear();
-        InputFrm& p = open_page();
-        type(p.RangeTxt, c.typed);
-        sim::clear_call_log();
-        click(p.doneBtn);
-        EXPECT_EQ(sent().front(), "setRange(" + group() + ", " + c.sent + ")");
+    // Exact, case-sensitive comparisons, except the filter ("ON" in any case) and the trailing
+    // blanks of the input mode; the range is kept within 0 to 20.
+    const Case cases[] = {
+        {p.DAACmbo->lineEdit(), "On", 2, "615"},
+        {p.DAACmbo->lineEdit(), "ON", 2, "615"},
+        {p.DAACmbo->lineEdit(), "on", 2, "615"},
+        {p.DAACmbo->lineEdit(), "Off", 2, "616"},
+        {p.DAACmbo->lineEdit(), "ON ", 2, "616"},
+        {p.CoupCmbo->lineEdit(), "AC Coupling", 1, "100"},
+        {p.CoupCmbo->lineEdit(), "ac coupling", 1, "101"},
+        {p.TrigDirCmbo->lineEdit(), "Pos/Exit ", 3, "411"},
+        {p.TrigOnCmbo->lineEdit(), "OFF", 4, "421"},
+        {p.TrigOnCmbo->lineEdit(), "off", 4, "420"},
+        {p.TrigModeCmbo->lineEdit(), "Level", 6, "414"},
+        {p.TrigModeCmbo->lineEdit(), "level", 6, "415"},
+        {p.inpmodeCmbo->lineEdit(), "ICP", 5, "131"},
+        {p.inpmodeCmbo->lineEdit(), "CHARGE", 5, "132"},
+        {p.inpmodeCmbo->lineEdit(), "MIC   ", 5, "133"},
+        {p.inpmodeCmbo->lineEdit(), "MIC_200V", 5, "134"},
+        {p.RangeTxt, "25", 0, "20"},
+        {p.RangeTxt, "-3", 0, "0"},
+        {p.RangeTxt, " 7.5 V", 0, "7.5"},
+        {p.RangeTxt, "volts", 0, "0"},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(std::string("\"") + c.typed + "\"");
+        // Earlier cases changed the other settings: look at this one only.
+        const Texts sent = ok_with(c.box, c.typed);
+        ASSERT_EQ(sent.size(), 9u);
+        Texts values = sent_first;
+        values[c.call] = c.sent;
+        EXPECT_EQ(sent[c.call], nine(group(), values)[c.call]);
     }
-    EXPECT_EQ(held(1).range, 0.1);  // "volts" reads as 0, the smallest range
-    open_page();
-    messages.clear();
-    type(page().RangeTxt, "25");
-    click(page().doneBtn);
+    // The module takes at most 10 V: 20 is refused, and said so.
     ASSERT_EQ(messages.size(), 1u);
     EXPECT_NE(messages[0].text.find("ost7720_setRange returned -"), std::string::npos);
-    EXPECT_EQ(held(1).range, 0.1);
 }
 
 TEST_F(InputFrmTest, LevelAndHysteresisFollowTheSlope) {
@@ -282,234 +202,101 @@ TEST_F(InputFrmTest, LevelAndHysteresisFollowTheSlope) {
         const char* slope;
         const char* level;
         const char* hysteresis;
-        const char* lower_sent;
-        const char* upper_sent;
-        double lower;
-        double upper;
+        const char* lower;
+        const char* upper;
     };
     for (const Case& c :
-         {Case{"Pos/Exit", "50", "10", "40", "50", 40, 50}, Case{"Neg/Enter", "50", "10", "50", "60", 50, 60},
-          Case{"Pos/Exit", "-12.5", ".5", "-13", "-12.5", -13, -12.5},
-          Case{"pos/exit", "1", "2", "1", "3", 1, 3}}) {
+         {Case{"Pos/Exit", "50", "10", "40", "50"}, Case{"Neg/Enter", "50", "10", "50", "60"},
+          Case{"Pos/Exit", "-12.5", ".5", "-13", "-12.5"}, Case{"pos/exit", "1", "2", "1", "3"}}) {
         SCOPED_TRACE(std::string(c.slope) + " " + c.level + " " + c.hysteresis);
-        InputFrm& p = open_page();
+        InputFrm& p = open();
         type(p.TrigDirCmbo, c.slope);
         type(p.TrigLvlTxt, c.level);
         type(p.HystTxt, c.hysteresis);
         sim::clear_call_log();
         click(p.doneBtn);
-        const Texts s = sent();
-        ASSERT_EQ(s.size(), 9u);
-        EXPECT_EQ(s[7], "setTriggerLevel(" + group() + ", 416, " + c.lower_sent + ")");
-        EXPECT_EQ(s[8], "setTriggerLevel(" + group() + ", 417, " + c.upper_sent + ")");
-        EXPECT_EQ(held(16).lower, c.lower);
-        EXPECT_EQ(held(16).upper, c.upper);
+        EXPECT_EQ(calls({"setTriggerLevel"}),
+                  (Texts{"setTriggerLevel(" + group() + ", 416, " + c.lower + ")",
+                         "setTriggerLevel(" + group() + ", 417, " + c.upper + ")"}));
     }
     EXPECT_TRUE(messages.empty());
 }
 
-TEST_F(InputFrmTest, ComparisonsAreExactExceptTheFilterAndTrailingBlanksOfTheMode) {
-    struct Case {
-        QComboBox* InputFrm::*box;
-        const char* typed;
-        size_t call;  // position among the set calls
-        const char* code;
-    };
-    const Case cases[] = {
-        {&InputFrm::DAACmbo, "On", 2, "615"},           {&InputFrm::DAACmbo, "ON", 2, "615"},
-        {&InputFrm::DAACmbo, "on", 2, "615"},           {&InputFrm::DAACmbo, "Off", 2, "616"},
-        {&InputFrm::DAACmbo, "OFF", 2, "616"},          {&InputFrm::DAACmbo, "ON ", 2, "616"},
-        {&InputFrm::CoupCmbo, "AC Coupling", 1, "100"}, {&InputFrm::CoupCmbo, "ac coupling", 1, "101"},
-        {&InputFrm::TrigDirCmbo, "Pos/Exit", 3, "410"}, {&InputFrm::TrigDirCmbo, "Pos/Exit ", 3, "411"},
-        {&InputFrm::TrigOnCmbo, "OFF", 4, "421"},       {&InputFrm::TrigOnCmbo, "off", 4, "420"},
-        {&InputFrm::TrigOnCmbo, "ON", 4, "420"},        {&InputFrm::TrigModeCmbo, "Level", 6, "414"},
-        {&InputFrm::TrigModeCmbo, "level", 6, "415"},   {&InputFrm::inpmodeCmbo, "VOLT", 5, "130"},
-        {&InputFrm::inpmodeCmbo, "ICP", 5, "131"},      {&InputFrm::inpmodeCmbo, "CHARGE", 5, "132"},
-        {&InputFrm::inpmodeCmbo, "MIC", 5, "133"},      {&InputFrm::inpmodeCmbo, "MIC   ", 5, "133"},
-        {&InputFrm::inpmodeCmbo, "MIC_200V", 5, "134"},
-    };
-    for (const Case& c : cases) {
-        SCOPED_TRACE(std::string("\"") + c.typed + "\"");
-        const Texts s = ok_with(page().*c.box, c.typed);
-        ASSERT_EQ(s.size(), 9u);
-        const std::string head = s[c.call].substr(0, s[c.call].find('('));
-        EXPECT_EQ(s[c.call], head + "(" + group() + ", " + c.code + ")");
-    }
-    EXPECT_TRUE(messages.empty());
-}
-
-TEST_F(InputFrmTest, ModeWithoutANameIsNotSentAndTheRestIs) {
+TEST_F(InputFrmTest, ModeWithoutANameIsNotSentAndTheChannelKeepsItsMode) {
     ASSERT_EQ(ost7720_setInputMode(global::session, global::group_inputs, 132), 0);
-    for (const char* typed : {"volt", " MIC", "MICRO", "XYZ", ""}) {
+    Texts values = sent_first;
+    values[5] = "";
+    for (const char* typed : {"volt", " MIC", "MICRO", ""}) {
         SCOPED_TRACE(std::string("\"") + typed + "\"");
-        const Texts s = ok_with(page().inpmodeCmbo, typed);
-        const std::string g = group();
-        EXPECT_EQ(s, (Texts{"setRange(" + g + ", 2)", "setCoupling(" + g + ", 101)",
-                            "setAntiAliasDigital(" + g + ", 615)", "setTriggerSlope(" + g + ", 410)",
-                            "setTriggerChannel(" + g + ", 421)", "setTriggerMode(" + g + ", 414)",
-                            "setTriggerLevel(" + g + ", 416, 5)", "setTriggerLevel(" + g + ", 417, 10)"}));
-        EXPECT_EQ(held(1).input_mode, 132);
+        EXPECT_EQ(ok_with(forms::get<InputFrm>().inpmodeCmbo->lineEdit(), typed), nine(group(), values));
         EXPECT_TRUE(main().isVisible());
     }
-    // Each reopening read the module's mode back.
-    open_page();
-    EXPECT_EQ(text(page().inpmodeCmbo), "CHARGE");
-    EXPECT_TRUE(messages.empty());
-}
-
-TEST_F(InputFrmTest, CancelSendsNothingAndReopeningShowsTheModule) {
-    InputFrm& p = open_page();
-    type(p.RangeTxt, "5");
-    type(p.TrigLvlTxt, "70");
-    type(p.inpmodeCmbo, "MIC");
-    click(p.AllSameChk);
-    type(p.ChnNumCmbo, "7");
-    sim::clear_call_log();
-    click(p.cancelBtn);
-    EXPECT_TRUE(sim::call_log().empty());
-    EXPECT_EQ(p.cur_chan, 1);
-    EXPECT_FALSE(p.isVisible());
-    EXPECT_TRUE(main().isVisible());
-
-    open_page();
-    EXPECT_EQ(text(p.ChnNumCmbo), "1");
-    EXPECT_EQ(text(p.RangeTxt), "2");
-    EXPECT_EQ(text(p.TrigLvlTxt), " 10");
-    EXPECT_EQ(text(p.inpmodeCmbo), "VOLT");
+    EXPECT_EQ(text(open().inpmodeCmbo), "CHARGE");
     EXPECT_TRUE(messages.empty());
 }
 
 TEST_F(InputFrmTest, ChannelTheSessionLacksGoesToTheDriverAndEachRefusalIsReported) {
-    InputFrm& p = open_page();
-    click(p.AllSameChk);
-    for (const char* typed : {"99", "0", "-3", "-32768.5"}) {
+    click(open().AllSameChk);
+    for (const char* typed : {"99", "0", "-32768.5"}) {
         SCOPED_TRACE(typed);
         const std::string target = typed == std::string("-32768.5") ? "-32768" : typed;  // half to even
-        // After the first pass the page reads a channel the session lacks: its reads are refused.
-        open_page();
-        type(p.ChnNumCmbo, typed);
-        type(p.RangeTxt, "2");
-        type(p.TrigLvlTxt, "10");
-        type(p.HystTxt, "5");
-        type(p.TrigDirCmbo, "Pos/Exit");
+        type(open().ChnNumCmbo, typed);
         messages.clear();
         sim::clear_call_log();
-        click(p.doneBtn);
-        const Texts s = sent();
-        ASSERT_EQ(s.size(), 9u);
-        EXPECT_EQ(s[0], "setRange(" + target + ", 2)");
-        EXPECT_EQ(s[8], "setTriggerLevel(" + target + ", 417, 10)");
-        const Texts names = {"setRange",        "setCoupling",       "setAntiAliasDigital",
-                             "setTriggerSlope", "setTriggerChannel", "setInputMode",
-                             "setTriggerMode",  "setTriggerLevel",   "setTriggerLevel"};
+        click(forms::get<InputFrm>().doneBtn);
+        const Texts sent = calls({"set"});
+        ASSERT_EQ(sent.size(), 9u);
         ASSERT_EQ(messages.size(), 9u);
         for (size_t i = 0; i < 9; ++i) {
-            EXPECT_EQ(messages[i].kind, dialogs::Kind::question);
-            EXPECT_NE(messages[i].text.find("ost7720_" + names[i] + " returned -"), std::string::npos)
-                << messages[i].text;
+            const std::string name = sent[i].substr(0, sent[i].find('('));
+            EXPECT_EQ(sent[i].substr(name.size(), target.size() + 2), "(" + target + ",");
+            EXPECT_NE(messages[i].text.find("ost7720_" + name + " returned -"), std::string::npos);
         }
-        EXPECT_EQ(std::to_string(p.cur_chan), target);
         EXPECT_TRUE(main().isVisible());
     }
     // Reopening reads the confirmed channel: each of the nine reads is refused and reported.
     messages.clear();
-    open_page();
-    EXPECT_EQ(text(p.ChnNumCmbo), "-32768");
+    EXPECT_EQ(text(open().ChnNumCmbo), "-32768");
     EXPECT_EQ(messages.size(), 9u);
-    EXPECT_TRUE(p.isVisible());
 }
 
 TEST_F(InputFrmTest, ChannelBeyondSixteenBitsIsRefusedWithoutACall) {
-    InputFrm& p = open_page();
+    InputFrm& p = open();
     click(p.AllSameChk);
-    for (const char* typed : {"40000", "1e10", "-40000", " 32767.5"}) {
+    for (const char* typed : {"40000", "-40000", " 32767.5"}) {
         SCOPED_TRACE(typed);
         messages.clear();
         type(p.ChnNumCmbo, typed);
         sim::clear_call_log();
         click(p.doneBtn);
         EXPECT_TRUE(sim::call_log().empty());
-        ASSERT_EQ(messages.size(), 1u);
-        EXPECT_EQ(messages[0].kind, dialogs::Kind::notice);
-        EXPECT_EQ(messages[0].text, "Channel number " + std::string(typed).substr(typed[0] == ' ') +
-                                        " is not an input channel of this session.\r\n"
-                                        "Choose a channel number from 1 to 16.");
+        EXPECT_EQ(notices(), Texts{"Channel number " + std::string(typed).substr(typed[0] == ' ') +
+                                   " is not an input channel of this session.\r\n"
+                                   "Choose a channel number from 1 to 16."});
         EXPECT_EQ(p.cur_chan, 1);
         EXPECT_TRUE(p.isVisible());
-        EXPECT_FALSE(main().isVisible());
     }
-    // The page stays as it was: a number that fits goes out.
-    type(p.ChnNumCmbo, "2");
-    messages.clear();
-    click(p.doneBtn);
-    EXPECT_EQ(p.cur_chan, 2);
-    EXPECT_TRUE(messages.empty());
-}
-
-TEST_F(InputFrmTest, FailedReadIsReportedAndTheReloadGoesOn) {
-    sim::fail("ost7720_getRange", -1105, 1);
-    sim::fail("ost7720_getInputMode", -1103, 1);
-    InputFrm& p = open_page();
-    ASSERT_EQ(messages.size(), 2u);
-    EXPECT_NE(messages[0].text.find("ost7720_getRange returned -1105"), std::string::npos);
-    EXPECT_NE(messages[1].text.find("ost7720_getInputMode returned -1103"), std::string::npos);
-    EXPECT_EQ(calls("ost7720_get").size(), 9u);
-    EXPECT_EQ(text(p.RangeTxt), "0");
-    EXPECT_EQ(text(p.TrigLvlTxt), " 10");
-    EXPECT_EQ(text(p.TrigModeCmbo), "Level");
-    EXPECT_EQ(text(p.inpmodeCmbo), "Combo1");  // no mode read: the designed text stays
-
-    // A failed write is reported too, and OK still goes on and returns.
-    messages.clear();
-    sim::fail("ost7720_setCoupling", -1105, 1);
-    sim::clear_call_log();
-    click(p.doneBtn);
-    EXPECT_EQ(sent().size(), 8u);  // "Combo1" names no mode
-    ASSERT_EQ(messages.size(), 1u);
-    EXPECT_NE(messages[0].text.find("ost7720_setCoupling returned -1105"), std::string::npos);
-    EXPECT_TRUE(main().isVisible());
 }
 
 TEST_F(InputFrmTest, FieldsStandInTheGridAndStayReadable) {
-    main().resize(900, 700);
-    InputFrm& p = open_page();
+    InputFrm& p = open();
     p.resize(900, 700);
-    ASSERT_EQ(p.size(), QSize(900, 700));
-    // Row unit 700 / 18 px, column unit 75 px; the second column starts five units further.
-    EXPECT_EQ(p.AllSameChk->pos(), QPoint(112, 39));  // 112.5 and 38.9 rounded
-    EXPECT_EQ(p.ChanNumLbl->pos(), QPoint(38, 117));
-    EXPECT_EQ(p.ChnNumCmbo->pos(), QPoint(150, 117));
+    // Rows of 700 / 18 px, columns of 75 px; the second column starts five columns further.
+    EXPECT_EQ(p.AllSameChk->pos(), QPoint(112, 39));
     EXPECT_EQ(p.AAACmbo->pos(), QPoint(150, 506));
-    EXPECT_EQ(p.inpmodeLbl->pos(), QPoint(412, 39));
-    EXPECT_EQ(p.inpmodeCmbo->pos(), QPoint(525, 39));
     EXPECT_EQ(p.TrigDirCmbo->pos(), QPoint(525, 428));
-    EXPECT_EQ(p.DAALbl->height(), 20);
-    EXPECT_EQ(page_check::layout_faults(&p), Texts{});
-    // Every field shows its text whole, the disabled boxes' fixed texts included.
-    for (QComboBox* box : {p.ChnNumCmbo, p.CoupCmbo, p.GndCmbo, p.DAACmbo, p.AAACmbo, p.inpmodeCmbo,
-                           p.TrigOnCmbo, p.TrigModeCmbo, p.TrigDirCmbo}) {
-        SCOPED_TRACE(text(box));
-        EXPECT_GE(box->lineEdit()->width(), box->fontMetrics().horizontalAdvance(box->currentText()) + 4);
-        EXPECT_LE(box->x() + box->width(),
-                  box == p.inpmodeCmbo || box == p.TrigOnCmbo || box == p.TrigModeCmbo || box == p.TrigDirCmbo
-                      ? 900
-                      : 412);
-    }
-
-    // In a narrow window the fields of a column start after its widest label, all at one left.
-    for (const QSize size : {QSize(533, 400), QSize(640, 480)}) {
+    for (QComboBox* box : {p.GndCmbo, p.AAACmbo, p.CoupCmbo, p.TrigDirCmbo})
+        EXPECT_GE(box->lineEdit()->width(), box->fontMetrics().horizontalAdvance(box->currentText()) + 4)
+            << text(box);
+    // In a narrow window the fields of a column start after its widest label.
+    for (const QSize size : {QSize(900, 700), QSize(533, 400)}) {
         SCOPED_TRACE(size.width());
         p.resize(size);
         EXPECT_EQ(page_check::layout_faults(&p), Texts{});
         EXPECT_GT(p.ChnNumCmbo->x(), p.AAALbl->x() + p.AAALbl->width());
         EXPECT_GT(p.inpmodeCmbo->x(), p.HystLbl->x() + p.HystLbl->width());
-        for (QWidget* field :
-             std::initializer_list<QWidget*>{p.RangeTxt, p.CoupCmbo, p.GndCmbo, p.DAACmbo, p.AAACmbo})
-            EXPECT_EQ(field->x(), p.ChnNumCmbo->x());
-        for (QWidget* field : std::initializer_list<QWidget*>{p.TrigOnCmbo, p.TrigModeCmbo, p.TrigLvlTxt,
-                                                              p.HystTxt, p.TrigDirCmbo})
-            EXPECT_EQ(field->x(), p.inpmodeCmbo->x());
-        EXPECT_LT(p.ChnNumCmbo->x() + p.ChnNumCmbo->width(), p.inpmodeLbl->x());
+        EXPECT_EQ(p.RangeTxt->x(), p.ChnNumCmbo->x());
+        EXPECT_EQ(p.HystTxt->x(), p.inpmodeCmbo->x());
     }
 }
 

@@ -1,275 +1,178 @@
-// The Measurement Control page: what it shows, what OK takes and refuses, the repeat notice.
+// The Measurement Control page: what it shows, what OK takes and refuses, the repeat notice, and
+// what the next measurement set-up sends.
 #include <gtest/gtest.h>
 
-#include <QTest>
 #include <cmath>
 
-#include "core/global.h"
-#include "core/windows.h"
-#include "display/MainFrm.h"
 #include "measure/measurement.h"
-#include "page_readability.h"
+#include "page_fixture.h"
 #include "pages/MeasFrm.h"
-#include "panel_fixture.h"
 
 namespace {
 
-class MeasFrmTest : public PanelTest {
+using global::flag_false;
+using global::flag_true;
+
+class MeasFrmTest : public PageTest {
   protected:
-    void SetUp() override {
-        PanelTest::SetUp();
-        main().Form_Load();
+    MeasFrm& open() {
+        main().MeasBtn_Click();
+        return forms::get<MeasFrm>();
     }
-
-    MainFrm& main() { return forms::get<MainFrm>(); }
-
-    // As the main window's Meas button does: reload, then take the main window's place.
-    MeasFrm& open_page() {
-        MeasFrm& page = forms::get<MeasFrm>();
-        page.load_Meas_Form();
-        switch_page(main(), page);
-        return page;
+    // single block, block mode, trigger source, domain, multi mainframe, block size, span
+    static std::vector<double> stored() {
+        using namespace global;
+        return {double(single_block),
+                double(block_mode),
+                double(trigger_source),
+                double(domain),
+                double(multi_mainframe),
+                double(blocksize),
+                span};
     }
-
-    static void type(QLineEdit* box, const char* text) {
-        box->clear();
-        QTest::keyClicks(box, QString::fromUtf8(text));
+    // The captions of the options checked, the designed blanks and spelling included.
+    static Texts checked(const MeasFrm& p) {
+        Texts out;
+        for (const QAbstractButton* b : std::initializer_list<const QAbstractButton*>{
+                 p.SingleBtn, p.RepeatBtn, p.BlockBtn, p.ContBtn, p.AutoBtn, p.ManualBtn, p.InputBtn,
+                 p.SourceBtn, p.TimeBtn, p.FreqBtn, p.mmcheck})
+            if (b->isChecked())
+                out.push_back(b->text().toStdString());
+        return out;
     }
-
-    static void click(QAbstractButton* b) { QTest::mouseClick(b, Qt::LeftButton); }
+    static void click_all(std::initializer_list<QAbstractButton*> buttons) {
+        for (QAbstractButton* b : buttons)
+            click(b);
+    }
 };
 
-TEST_F(MeasFrmTest, OpeningShowsTheStoredSettings) {
-    MeasFrm& page = open_page();
-    EXPECT_EQ(page.windowTitle().toStdString(), "Measurement Control");
-    EXPECT_TRUE(page.SingleBtn->isChecked());
-    EXPECT_TRUE(page.BlockBtn->isChecked());
-    EXPECT_TRUE(page.AutoBtn->isChecked());
-    EXPECT_TRUE(page.TimeBtn->isChecked());
-    EXPECT_FALSE(page.mmcheck->isChecked());
-    EXPECT_EQ(page.BlocksizeTxt->text().toStdString(), " 1024");
-    EXPECT_EQ(page.SpanTxt->text().toStdString(), " 20000");
+TEST_F(MeasFrmTest, OpeningShowsTheStoredSettingsAndCancelKeepsThem) {
+    MeasFrm& page = open();
+    EXPECT_EQ(page.MeasFrame->title().toStdString(), "Meas ");
+    EXPECT_EQ(checked(page), (Texts{"Single Block", "Block ", "Auto", "Time"}));
+    EXPECT_EQ(text(page.BlocksizeTxt), " 1024");
+    EXPECT_EQ(text(page.SpanTxt), " 20000");
 
-    using namespace global;
-    single_block = flag_false;
-    block_mode = flag_false;
-    trigger_source = 3;
-    domain = 1;
-    multi_mainframe = 1;
-    blocksize = 4096;
-    span = 12800.5;
-    page.load_Meas_Form();
-    EXPECT_TRUE(page.RepeatBtn->isChecked());
-    EXPECT_TRUE(page.ContBtn->isChecked());
-    EXPECT_TRUE(page.SourceBtn->isChecked());
-    EXPECT_TRUE(page.FreqBtn->isChecked());
-    EXPECT_TRUE(page.mmcheck->isChecked());
-    EXPECT_EQ(page.BlocksizeTxt->text().toStdString(), " 4096");
-    EXPECT_EQ(page.SpanTxt->text().toStdString(), " 12800.5");
+    click_all({page.RepeatBtn, page.ContBtn, page.SourceBtn, page.FreqBtn, page.mmcheck});
+    type(page.BlocksizeTxt, "8192");
+    type(page.SpanTxt, "400");
+    click(page.cancelBtn);
+    EXPECT_TRUE(main().isVisible());
+    EXPECT_EQ(stored(), (std::vector<double>{flag_true, flag_true, 0, 0, 0, 1024, 20000}));
 
-    // A value no button stands for leaves that frame as it was.
-    trigger_source = 7;
-    page.load_Meas_Form();
-    EXPECT_TRUE(page.SourceBtn->isChecked());
-}
-
-TEST_F(MeasFrmTest, CaptionsAreExactlyTheDesignedOnes) {
-    MeasFrm& page = open_page();
-    auto caption = [](const QAbstractButton* b) { return b->text().toStdString(); };
-    auto title = [](const QGroupBox* g) { return g->title().toStdString(); };
-    EXPECT_EQ(caption(page.BlockBtn), "Block ");
-    EXPECT_EQ(title(page.MeasFrame), "Meas ");
-    EXPECT_EQ(caption(page.ContBtn), "Continous");
-    EXPECT_EQ(caption(page.SingleBtn), "Single Block");
-    EXPECT_EQ(caption(page.RepeatBtn), "Repeat");
-    EXPECT_EQ(caption(page.mmcheck), "Multi Mainframe");
-    EXPECT_EQ(title(page.DomFrm), "Domain");
-    EXPECT_EQ(title(page.SpanFrame), "Freq Span");
-    EXPECT_EQ(title(page.BlocksizeFrame), "Blocksize");
-    EXPECT_EQ(title(page.TrigFrame), "Trigger");
-    EXPECT_EQ(title(page.ModeFrame), "Mode");
-    // Each frame is its own group of options.
-    EXPECT_EQ(page.AutoBtn->parentWidget(), page.TrigFrame);
-    EXPECT_EQ(page.TimeBtn->parentWidget(), page.DomFrm);
-    EXPECT_EQ(page.SingleBtn->parentWidget(), page.MeasFrame);
+    global::single_block = global::block_mode = flag_false;
+    global::trigger_source = 3;
+    global::domain = global::multi_mainframe = 1;
+    global::blocksize = 4096;
+    global::span = 12800.5;
+    open();
+    EXPECT_EQ(checked(page), (Texts{"Repeat", "Continous", "Source", "Frequency", "Multi Mainframe"}));
+    EXPECT_EQ(text(page.BlocksizeTxt), " 4096");
+    EXPECT_EQ(text(page.SpanTxt), " 12800.5");
+    EXPECT_TRUE(messages.empty());
 }
 
 TEST_F(MeasFrmTest, OkStoresEveryChoice) {
-    MeasFrm& page = open_page();
-    click(page.RepeatBtn);
-    click(page.ContBtn);
-    click(page.ManualBtn);
-    click(page.FreqBtn);
-    type(page.BlocksizeTxt, "2048.5");
+    MeasFrm& page = open();
+    click_all({page.RepeatBtn, page.ContBtn, page.ManualBtn, page.FreqBtn});
+    type(page.BlocksizeTxt, "2048.5");  // the half goes to the even neighbour
     type(page.SpanTxt, "76800");
     click(page.doneBtn);
-
-    using namespace global;
-    EXPECT_EQ(single_block, flag_false);
-    EXPECT_EQ(block_mode, flag_false);
-    EXPECT_EQ(trigger_source, 1);
-    EXPECT_EQ(domain, 1);
-    EXPECT_EQ(multi_mainframe, 0);
-    EXPECT_EQ(blocksize, 2048);  // the half goes to the even neighbour
-    EXPECT_EQ(span, 76800.0);
-    EXPECT_TRUE(messages.empty());
     EXPECT_TRUE(main().isVisible());
-    EXPECT_FALSE(page.isVisible());
+    EXPECT_EQ(stored(), (std::vector<double>{flag_false, flag_false, 1, 1, 0, 2048, 76800}));
 
-    open_page();
-    click(page.InputBtn);
-    click(page.TimeBtn);
-    click(page.SingleBtn);
-    click(page.BlockBtn);
-    type(page.BlocksizeTxt, "  511.5 points");
-    type(page.SpanTxt, ".5");
-    click(page.doneBtn);
-    EXPECT_EQ(single_block, flag_true);
-    EXPECT_EQ(block_mode, flag_true);
-    EXPECT_EQ(trigger_source, 2);
-    EXPECT_EQ(domain, 0);
-    EXPECT_EQ(blocksize, 512);
-    EXPECT_EQ(span, 0.5);
-
-    open_page();
-    click(page.SourceBtn);
-    click(page.doneBtn);
-    EXPECT_EQ(trigger_source, 3);
+    click_all({open().SingleBtn, page.BlockBtn, page.InputBtn, page.TimeBtn, page.doneBtn});
+    EXPECT_EQ(stored(), (std::vector<double>{flag_true, flag_true, 2, 0, 0, 2048, 76800}));
+    click_all({open().SourceBtn, page.doneBtn});
+    EXPECT_EQ(global::trigger_source, 3);
+    EXPECT_TRUE(messages.empty());
 }
 
 TEST_F(MeasFrmTest, RefusedBlockSizesAndSpansKeepTheStoredValues) {
     struct Case {
-        const char* text;
-        bool taken;
-        double value;
+        bool span;
+        const char* typed;
+        double stored;  // 1024 and 20000 were there before: refused
     };
-    const std::vector<Case> sizes = {
-        {"0", false, 0},   {"-5", false, 0},   {"abc", false, 0},        {"", false, 0},
-        {"0.4", false, 0}, {"3E10", false, 0}, {"2147483648", false, 0}, {"2147483647", true, 2147483647},
-        {"0.6", true, 1}};
-    for (const Case& c : sizes) {
+    const Case cases[] = {
+        {false, "0", 1024},
+        {false, "-5", 1024},
+        {false, "abc", 1024},
+        {false, "0.4", 1024},
+        {false, "3E10", 1024},
+        {false, "2147483648", 1024},
+        {false, "2147483647", 2147483647},
+        {false, "  511.5 points", 512},
+        {true, "76801", 20000},
+        {true, "0", 20000},
+        {true, "-100", 20000},
+        {true, "Hz", 20000},
+        {true, "76800.99", 76800.99},
+        {true, "1E-3", .001},
+        {true, "51200 Hz", 51200},
+    };
+    for (const Case& c : cases) {
         global::blocksize = 1024;
-        MeasFrm& page = open_page();
-        type(page.BlocksizeTxt, c.text);
-        click(page.doneBtn);
-        EXPECT_EQ(global::blocksize, c.taken ? static_cast<int32_t>(c.value) : 1024) << '"' << c.text << '"';
-    }
-    const std::vector<Case> spans = {{"76801", false, 0},  {"0", false, 0},
-                                     {"-100", false, 0},   {"Hz", false, 0},
-                                     {"1E6", false, 0},    {"76800.99", true, 76800.99},
-                                     {"1E-3", true, .001}, {"51200 Hz", true, 51200}};
-    for (const Case& c : spans) {
         global::span = 20000.0;
-        MeasFrm& page = open_page();
-        type(page.SpanTxt, c.text);
+        MeasFrm& page = open();
+        type(c.span ? page.SpanTxt : page.BlocksizeTxt, c.typed);
         click(page.doneBtn);
-        EXPECT_EQ(global::span, c.taken ? c.value : 20000.0) << '"' << c.text << '"';
+        EXPECT_EQ(c.span ? global::span : global::blocksize, c.stored) << '"' << c.typed << '"';
     }
     EXPECT_TRUE(messages.empty());
 }
 
 TEST_F(MeasFrmTest, RepeatWithMultiMainframeShowsTheNoticeOnceAndKeepsSingleBlock) {
-    MeasFrm& page = open_page();
-    click(page.RepeatBtn);
-    click(page.mmcheck);
-    click(page.doneBtn);
-    ASSERT_EQ(messages.size(), 1u);
-    EXPECT_EQ(messages[0].kind, dialogs::Kind::notice);
-    EXPECT_EQ(messages[0].text,
-              "Soft Front Panel does not support repeat and multi mainframe.\r\n\r\n"
-              "This is a limitation of this example program, not the Plug&Play library\r\n\r\n"
-              "Repeat has been turned off");
-    EXPECT_EQ(global::single_block, global::flag_true);
+    MeasFrm& page = open();
+    click_all({page.RepeatBtn, page.mmcheck, page.doneBtn});
+    EXPECT_EQ(notices(), Texts{"Soft Front Panel does not support repeat and multi mainframe.\r\n\r\n"
+                               "This is a limitation of this example program, not the Plug&Play library\r\n"
+                               "\r\nRepeat has been turned off"});
+    EXPECT_EQ(global::single_block, flag_true);
     EXPECT_EQ(global::multi_mainframe, 1);
-
-    open_page();
-    EXPECT_TRUE(page.SingleBtn->isChecked());
-    EXPECT_TRUE(page.mmcheck->isChecked());
-    // Single Block with Multi Mainframe is fine: no further notice.
+    EXPECT_EQ(checked(open()), (Texts{"Single Block", "Block ", "Auto", "Time", "Multi Mainframe"}));
     click(page.doneBtn);
     EXPECT_EQ(messages.size(), 1u);
 }
 
-TEST_F(MeasFrmTest, CancelChangesNothingAndTheNextOpeningShowsTheStoredSettings) {
-    MeasFrm& page = open_page();
-    click(page.RepeatBtn);
-    click(page.ContBtn);
-    click(page.SourceBtn);
-    click(page.FreqBtn);
-    click(page.mmcheck);
-    type(page.BlocksizeTxt, "8192");
-    type(page.SpanTxt, "400");
-    click(page.cancelBtn);
-
-    using namespace global;
-    EXPECT_EQ(single_block, flag_true);
-    EXPECT_EQ(block_mode, flag_true);
-    EXPECT_EQ(trigger_source, 0);
-    EXPECT_EQ(domain, 0);
-    EXPECT_EQ(multi_mainframe, 0);
-    EXPECT_EQ(blocksize, 1024);
-    EXPECT_EQ(span, 20000.0);
-    EXPECT_TRUE(messages.empty());
-    EXPECT_TRUE(main().isVisible());
-
-    open_page();
-    EXPECT_TRUE(page.SingleBtn->isChecked());
-    EXPECT_TRUE(page.AutoBtn->isChecked());
-    EXPECT_FALSE(page.mmcheck->isChecked());
-    EXPECT_EQ(page.BlocksizeTxt->text().toStdString(), " 1024");
-}
-
 TEST_F(MeasFrmTest, TheNextSetUpSendsWhatOkStored) {
-    MeasFrm& page = open_page();
-    click(page.ContBtn);
-    click(page.FreqBtn);
-    click(page.ManualBtn);
+    MeasFrm& page = open();
+    click_all({page.ContBtn, page.FreqBtn, page.ManualBtn});
     type(page.BlocksizeTxt, "2048");
     type(page.SpanTxt, "10000");
     click(page.doneBtn);
     sim::clear_call_log();
     setup_measurement();  // what Go runs first
-
     auto sent = [](const std::string& name) {
         for (const sim::Call& c : sim::call_log())
-            if (c.name == name)
+            if (c.name == "ost7720_" + name)
                 return c.args.back();
         return std::string("not sent");
     };
-    EXPECT_EQ(sent("ost7720_setBlocksize"), "2048");
-    EXPECT_EQ(sent("ost7720_setSpan"), "10000");
-    EXPECT_EQ(sent("ost7720_setDataMode"), "341");     // continuous
-    EXPECT_EQ(sent("ost7720_setCalcData"), "725");     // frequency
-    EXPECT_EQ(sent("ost7720_setAutoTrigger"), "440");  // not automatic
-    EXPECT_EQ(sent("ost7720_setArmMode"), "431");      // one mainframe
+    EXPECT_EQ(sent("setBlocksize"), "2048");
+    EXPECT_EQ(sent("setSpan"), "10000");
+    EXPECT_EQ(sent("setDataMode"), "341");     // continuous
+    EXPECT_EQ(sent("setCalcData"), "725");     // frequency
+    EXPECT_EQ(sent("setAutoTrigger"), "440");  // not automatic
+    EXPECT_EQ(sent("setArmMode"), "431");      // one mainframe
 }
 
 TEST_F(MeasFrmTest, FramesStandInTwoReadableColumns) {
-    MeasFrm& page = open_page();
+    MeasFrm& page = open();
     page.resize(900, 700);
-    // Left column: Meas, Mode, Trigger; right column one and a half frame widths further.
-    const int left = qRound(900 / 10.0);
-    EXPECT_EQ(page.MeasFrame->x(), left);
-    EXPECT_EQ(page.ModeFrame->x(), left);
-    EXPECT_EQ(page.TrigFrame->x(), left);
-    EXPECT_EQ(page.BlocksizeFrame->x(),
-              static_cast<int>(std::nearbyint(left + 1.5 * page.MeasFrame->width())));
-    EXPECT_EQ(page.SpanFrame->x(), page.BlocksizeFrame->x());
-    EXPECT_EQ(page.DomFrm->x(), page.BlocksizeFrame->x());
-    // Rows in fourteenths of 700 px: 50 px each.
-    EXPECT_EQ(page.MeasFrame->geometry().top(), 50);
-    EXPECT_EQ(page.ModeFrame->geometry().top(), 200);
-    EXPECT_EQ(page.TrigFrame->geometry().top(), 350);
-    EXPECT_EQ(page.TrigFrame->height(), 200);
-    EXPECT_EQ(page.SpanFrame->geometry().top(), 50);
-    EXPECT_EQ(page.BlocksizeFrame->geometry().top(), 200);
-    EXPECT_EQ(page.DomFrm->geometry().top(), 350);
+    // Left column at a tenth of the width, right one a frame and a half further; rows of 50 px.
+    const int left = 90;
+    const int right = static_cast<int>(std::nearbyint(left + 1.5 * page.MeasFrame->width()));
+    EXPECT_EQ(page.MeasFrame->pos(), QPoint(left, 50));
+    EXPECT_EQ(page.ModeFrame->pos(), QPoint(left, 200));
+    EXPECT_EQ(page.TrigFrame->geometry(), QRect(left, 350, page.MeasFrame->width(), 200));
+    EXPECT_EQ(page.SpanFrame->pos(), QPoint(right, 50));
+    EXPECT_EQ(page.BlocksizeFrame->pos(), QPoint(right, 200));
+    EXPECT_EQ(page.DomFrm->pos(), QPoint(right, 350));
     EXPECT_EQ(page.mmcheck->y(), 500);  // halfway between the lower edges 550 and 450
-    EXPECT_EQ(page.AutoBtn->y(), 40);
-    EXPECT_EQ(page.SourceBtn->y(), 160);
-    EXPECT_EQ(page.AutoBtn->x(), 6);
+    EXPECT_EQ(page.AutoBtn->pos(), QPoint(6, 40));
     EXPECT_EQ(page.TimeBtn->x(), 16);
-    EXPECT_EQ(page_check::layout_faults(&page), std::vector<std::string>{});
+    EXPECT_EQ(page_check::layout_faults(&page), Texts{});
 }
 
 }  // namespace
