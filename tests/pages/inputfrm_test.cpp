@@ -2,6 +2,8 @@
 // and the refusals, checked against the simulator's call log and the settings it keeps.
 #include <gtest/gtest.h>
 
+#include <array>
+
 #include "ost7720.h"
 #include "page_fixture.h"
 #include "pages/InputFrm.h"
@@ -198,26 +200,21 @@ TEST_F(InputFrmTest, TypedTextsBecomeCodesAndLimitedRanges) {
 }
 
 TEST_F(InputFrmTest, LevelAndHysteresisFollowTheSlope) {
-    struct Case {
-        const char* slope;
-        const char* level;
-        const char* hysteresis;
-        const char* lower;
-        const char* upper;
-    };
-    for (const Case& c :
-         {Case{"Pos/Exit", "50", "10", "40", "50"}, Case{"Neg/Enter", "50", "10", "50", "60"},
-          Case{"Pos/Exit", "-12.5", ".5", "-13", "-12.5"}, Case{"pos/exit", "1", "2", "1", "3"}}) {
-        SCOPED_TRACE(std::string(c.slope) + " " + c.level + " " + c.hysteresis);
+    // slope, level, hysteresis typed; lower and upper level sent
+    for (const auto& [slope, level, hysteresis, lower, upper] :
+         {std::array{"Pos/Exit", "50", "10", "40", "50"}, std::array{"Neg/Enter", "50", "10", "50", "60"},
+          std::array{"Pos/Exit", "-12.5", ".5", "-13", "-12.5"},
+          std::array{"pos/exit", "1", "2", "1", "3"}}) {
+        SCOPED_TRACE(std::string(slope) + " " + level + " " + hysteresis);
         InputFrm& p = open();
-        type(p.TrigDirCmbo, c.slope);
-        type(p.TrigLvlTxt, c.level);
-        type(p.HystTxt, c.hysteresis);
+        type(p.TrigDirCmbo, slope);
+        type(p.TrigLvlTxt, level);
+        type(p.HystTxt, hysteresis);
         sim::clear_call_log();
         click(p.doneBtn);
         EXPECT_EQ(calls({"setTriggerLevel"}),
-                  (Texts{"setTriggerLevel(" + group() + ", 416, " + c.lower + ")",
-                         "setTriggerLevel(" + group() + ", 417, " + c.upper + ")"}));
+                  (Texts{"setTriggerLevel(" + group() + ", 416, " + lower + ")",
+                         "setTriggerLevel(" + group() + ", 417, " + upper + ")"}));
     }
     EXPECT_TRUE(messages.empty());
 }
@@ -263,7 +260,7 @@ TEST_F(InputFrmTest, ChannelTheSessionLacksGoesToTheDriverAndEachRefusalIsReport
 TEST_F(InputFrmTest, ChannelBeyondSixteenBitsIsRefusedWithoutACall) {
     InputFrm& p = open();
     click(p.AllSameChk);
-    for (const char* typed : {"40000", "-40000", " 32767.5"}) {
+    for (const char* typed : {"40000", "65537", " 32767.5"}) {
         SCOPED_TRACE(typed);
         messages.clear();
         type(p.ChnNumCmbo, typed);

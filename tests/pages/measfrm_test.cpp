@@ -72,17 +72,32 @@ TEST_F(MeasFrmTest, OpeningShowsTheStoredSettingsAndCancelKeepsThem) {
     EXPECT_TRUE(messages.empty());
 }
 
-TEST_F(MeasFrmTest, OkStoresEveryChoice) {
+TEST_F(MeasFrmTest, OkStoresEveryChoiceAndTheNextSetUpSendsIt) {
     MeasFrm& page = open();
     click_all({page.RepeatBtn, page.ContBtn, page.ManualBtn, page.FreqBtn});
     type(page.BlocksizeTxt, "2048.5");  // the half goes to the even neighbour
-    type(page.SpanTxt, "76800");
+    type(page.SpanTxt, "10000");
     click(page.doneBtn);
     EXPECT_TRUE(main().isVisible());
-    EXPECT_EQ(stored(), (std::vector<double>{flag_false, flag_false, 1, 1, 0, 2048, 76800}));
+    EXPECT_EQ(stored(), (std::vector<double>{flag_false, flag_false, 1, 1, 0, 2048, 10000}));
+    // The next set-up (what Go runs first) sends them.
+    sim::clear_call_log();
+    setup_measurement();
+    auto sent = [](const std::string& name) {
+        for (const sim::Call& c : sim::call_log())
+            if (c.name == "ost7720_" + name)
+                return c.args.back();
+        return std::string("not sent");
+    };
+    EXPECT_EQ(sent("setBlocksize"), "2048");
+    EXPECT_EQ(sent("setSpan"), "10000");
+    EXPECT_EQ(sent("setDataMode"), "341");     // continuous
+    EXPECT_EQ(sent("setCalcData"), "725");     // frequency
+    EXPECT_EQ(sent("setAutoTrigger"), "440");  // not automatic
+    EXPECT_EQ(sent("setArmMode"), "431");      // one mainframe
 
     click_all({open().SingleBtn, page.BlockBtn, page.InputBtn, page.TimeBtn, page.doneBtn});
-    EXPECT_EQ(stored(), (std::vector<double>{flag_true, flag_true, 2, 0, 0, 2048, 76800}));
+    EXPECT_EQ(stored(), (std::vector<double>{flag_true, flag_true, 2, 0, 0, 2048, 10000}));
     click_all({open().SourceBtn, page.doneBtn});
     EXPECT_EQ(global::trigger_source, 3);
     EXPECT_TRUE(messages.empty());
@@ -94,23 +109,22 @@ TEST_F(MeasFrmTest, RefusedBlockSizesAndSpansKeepTheStoredValues) {
         const char* typed;
         double stored;  // 1024 and 20000 were there before: refused
     };
-    const Case cases[] = {
-        {false, "0", 1024},
-        {false, "-5", 1024},
-        {false, "abc", 1024},
-        {false, "0.4", 1024},
-        {false, "3E10", 1024},
-        {false, "2147483648", 1024},
-        {false, "2147483647", 2147483647},
-        {false, "  511.5 points", 512},
-        {true, "76801", 20000},
-        {true, "0", 20000},
-        {true, "-100", 20000},
-        {true, "Hz", 20000},
-        {true, "76800.99", 76800.99},
-        {true, "1E-3", .001},
-        {true, "51200 Hz", 51200},
-    };
+    const Case cases[] = {{false, "0", 1024},
+                          {false, "-5", 1024},
+                          {false, "abc", 1024},
+                          {false, "0.4", 1024},
+                          {false, "3E10", 1024},
+                          {false, "2147483648", 1024},
+                          {false, "2147483647", 2147483647},
+                          {false, "  511.5 points", 512},
+                          {true, "76800", 76800},
+                          {true, "76801", 20000},
+                          {true, "0", 20000},
+                          {true, "-100", 20000},
+                          {true, "Hz", 20000},
+                          {true, "76800.99", 76800.99},
+                          {true, "1E-3", .001},
+                          {true, "51200 Hz", 51200}};
     for (const Case& c : cases) {
         global::blocksize = 1024;
         global::span = 20000.0;
@@ -133,28 +147,6 @@ TEST_F(MeasFrmTest, RepeatWithMultiMainframeShowsTheNoticeOnceAndKeepsSingleBloc
     EXPECT_EQ(checked(open()), (Texts{"Single Block", "Block ", "Auto", "Time", "Multi Mainframe"}));
     click(page.doneBtn);
     EXPECT_EQ(messages.size(), 1u);
-}
-
-TEST_F(MeasFrmTest, TheNextSetUpSendsWhatOkStored) {
-    MeasFrm& page = open();
-    click_all({page.ContBtn, page.FreqBtn, page.ManualBtn});
-    type(page.BlocksizeTxt, "2048");
-    type(page.SpanTxt, "10000");
-    click(page.doneBtn);
-    sim::clear_call_log();
-    setup_measurement();  // what Go runs first
-    auto sent = [](const std::string& name) {
-        for (const sim::Call& c : sim::call_log())
-            if (c.name == "ost7720_" + name)
-                return c.args.back();
-        return std::string("not sent");
-    };
-    EXPECT_EQ(sent("setBlocksize"), "2048");
-    EXPECT_EQ(sent("setSpan"), "10000");
-    EXPECT_EQ(sent("setDataMode"), "341");     // continuous
-    EXPECT_EQ(sent("setCalcData"), "725");     // frequency
-    EXPECT_EQ(sent("setAutoTrigger"), "440");  // not automatic
-    EXPECT_EQ(sent("setArmMode"), "431");      // one mainframe
 }
 
 TEST_F(MeasFrmTest, FramesStandInTwoReadableColumns) {
