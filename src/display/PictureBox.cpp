@@ -408,7 +408,12 @@ void PictureBox::trace_to(const float* xs, const double* ys, int n, double low, 
     // is kept as its lowest and highest y, whose rows are the run's ends.
     const QRgb color = foreground().rgb();
     constexpr double inf = std::numeric_limits<double>::infinity();
-    column_edges(map, column_edges_);
+    // The edges cost a few divisions per column; they pay only when columns hold several
+    // samples. Without them every sample takes the exact path.
+    if (n >= 2 * w)
+        column_edges(map, column_edges_);
+    else
+        column_edges_.assign(static_cast<size_t>(w) + 1, std::numeric_limits<double>::quiet_NaN());
     // The x range [lo, hi) of column c; empty when the column is outside the picture or one of
     // its edges is unsettled.
     auto column_range = [&](int32_t c, double& lo, double& hi) {
