@@ -57,6 +57,14 @@ e2e_cleanup() {
     if [ -n "$E2E_DIR" ]; then
         if [ "$status" -ne 0 ] && [ "$status" -ne 77 ] || [ "$E2E_KEEP" -ne 0 ]; then
             echo "The run's files (call trace, panel log, screenshots) are kept in $E2E_DIR" >&2
+            if [ -s "$E2E_DIR/panel.log" ]; then
+                echo "--- the panel's output, last lines:" >&2
+                tail -n 20 "$E2E_DIR/panel.log" >&2
+            fi
+            if [ -s "$E2E_DIR/calls.txt" ]; then
+                echo "--- the last driver calls:" >&2
+                tail -n 20 "$E2E_DIR/calls.txt" >&2
+            fi
         else
             rm -rf "$E2E_DIR"
         fi
