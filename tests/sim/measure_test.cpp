@@ -221,20 +221,22 @@ TEST(SimMeasure, SourceTriggerFiresAtThePeriodStart) {
     EXPECT_GT(v[2], v[0]);
 }
 
-TEST(SimMeasure, SpectrumOfASinePeaksInItsBin) {
+TEST(SimMeasure, SpectrumOfASineIsTheHannMainLobeInItsBin) {
     Rig r;
     r.source(170, 1.0, 1000.0);  // bin 20 of 50 Hz bins
     ASSERT_EQ(ost7720_setEnable(r.s, r.inputs, 271, 280), 0);
     r.start(341);
     sim::advance_clock(1024 / fs);
     std::vector<double> spectrum = r.read(2, 346, 512);
-    EXPECT_NEAR(spectrum[20], 1.0, 0.01);
     EXPECT_EQ(std::max_element(spectrum.begin(), spectrum.end()) - spectrum.begin(), 20);
+    EXPECT_NEAR(spectrum[20], 1.0, 0.01);
+    EXPECT_NEAR(spectrum[19], 0.5, 0.01);  // the Hann main lobe: half the height one bin away
+    EXPECT_NEAR(spectrum[21], 0.5, 0.01);
     for (size_t k : {0, 5, 17, 23, 100, 511})
         EXPECT_LT(spectrum[k], 0.01) << k;
 }
 
-TEST(SimMeasure, LoopedBackSourcesAreClippedAcCoupledAndBurst) {
+TEST(SimMeasure, LoopedBackSourcesAreClippedAcCoupledBurstAndRamped) {
     Rig r;
     r.source(170, 5.0, 1000.0);
     ASSERT_EQ(ost7720_setRange(r.s, 1, 1.0), 0);
@@ -266,6 +268,15 @@ TEST(SimMeasure, LoopedBackSourcesAreClippedAcCoupledAndBurst) {
     sim::advance_clock(4096 / fs);
     v = b.read(1, 345, 4096);
     EXPECT_LT(*std::max_element(v.begin(), v.end()), 0.01);
+
+    Rig m;  // the same constant ramped up over 2 s from its activation: 0.5 V after 1 s
+    ASSERT_EQ(ost7720_setRampRate(m.s, 4098, 2.0), 0);
+    m.source(170, 1.0, 0.0, 90.0);
+    m.start(341);
+    sim::advance_clock(1.0);
+    for (int32_t a = m.available(1); a > 1; --a)
+        m.read(1);
+    EXPECT_NEAR(m.read_mean(1), 0.495, 0.01);  // the block over 0.98 .. 1.0 s
 }
 
 TEST(SimMeasure, ArbitraryTableIsDownloadedAndPlayedCyclically) {
