@@ -1,5 +1,7 @@
 #include "bench_support.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
@@ -9,6 +11,8 @@
 #include <random>
 
 namespace bench {
+
+Timings::Timings() : ConsoleReporter(isatty(STDOUT_FILENO) ? OO_ColorTabular : OO_Tabular) {}
 
 void Timings::ReportRuns(const std::vector<Run>& reports) {
     ConsoleReporter::ReportRuns(reports);

@@ -19,6 +19,7 @@ namespace bench {
 // waits for a processor. Both are kept.
 class Timings : public benchmark::ConsoleReporter {
   public:
+    Timings();  // colours only on a terminal
     void ReportRuns(const std::vector<Run>& reports) override;
 
     // CPU seconds per iteration of the named benchmark; 0 when it did not run (a filter left it
