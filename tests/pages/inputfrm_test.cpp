@@ -298,3 +298,47 @@ TEST_F(InputFrmTest, FieldsStandInTheGridAndStayReadable) {
 }
 
 }  // namespace
+
+namespace {
+
+// After OK, the module measures with what the page sent: the looped-back 1 V sine is clipped by a
+// lower range, and an input set to trigger starts the block on its level crossing.
+TEST_F(InputFrmTest, SettingsSentByOkShapeTheNextBlock) {
+    sim::use_virtual_clock();
+    auto one_block = [] {
+        main().GoBtn_Click();
+        // A block takes 1024 / 51200 s once triggered; the 1 kHz sine crosses within 1 ms.
+        for (int tick = 0; tick < 10 && global::running == global::flag_true; ++tick) {
+            sim::advance_clock(0.005);
+            main().MainTimer_Timer();
+        }
+        EXPECT_EQ(global::running, global::flag_false);
+        EXPECT_EQ(global::trace_has_data[0], global::flag_true);
+        return std::vector<double>(global::trace1_data.begin(), global::trace1_data.begin() + 1024);
+    };
+
+    InputFrm& p = open();
+    type(p.RangeTxt, "0.5");
+    click(p.doneBtn);
+    const std::vector<double> clipped = one_block();
+    EXPECT_DOUBLE_EQ(*std::max_element(clipped.begin(), clipped.end()), 0.5);
+    EXPECT_DOUBLE_EQ(*std::min_element(clipped.begin(), clipped.end()), -0.5);
+    EXPECT_EQ(global::trace_range[0], 0.5);
+
+    global::trigger_source = 2;  // "Input" on the Meas page
+    open();
+    type(p.RangeTxt, "2");
+    type(p.TrigOnCmbo, "ON");
+    type(p.TrigDirCmbo, "Pos/Exit");
+    type(p.TrigLvlTxt, "25");  // 25 % of 2 V: the sine rises through 0.5 V
+    type(p.HystTxt, "10");
+    click(p.doneBtn);
+    const std::vector<double> triggered = one_block();
+    // 1 kHz sampled at 51200 Hz rises at most 0.123 V per sample.
+    EXPECT_GE(triggered[0], 0.5 - 0.01);
+    EXPECT_LT(triggered[0], 0.5 + 0.13);
+    EXPECT_GT(triggered[1], triggered[0]);
+    EXPECT_TRUE(notices().empty());
+}
+
+}  // namespace
