@@ -1,7 +1,10 @@
 #include "measure.h"
 
 #include <algorithm>
+#include <array>
+#include <bit>
 #include <cmath>
+#include <cstddef>
 #include <limits>
 
 #include "signals.h"
@@ -54,6 +57,84 @@ int32_t input_index(const Channel& ch) {
 const Channel* channel_of(const Session& s, int32_t id) {
     const ChannelRef* ref = find_channel(s, id);
     return ref ? &channel_at(*ref) : nullptr;
+}
+
+// Equal to the bit, so that -0 and 0 count as different and a NaN as equal to itself.
+bool same_bits(double a, double b) {
+    return std::bit_cast<uint64_t>(a) == std::bit_cast<uint64_t>(b);
+}
+
+// The sum of the session's active sources as an input sees them (AC coupled or not) over n samples
+// from t_first. Every input of a block sees the same sum, so the last few sums are kept with
+// everything they were worked out from (the sources' settings, tables included, the times and
+// the coupling) and handed out again while all of that is unchanged: a changed setting is seen
+// at the next read, as when the sum is worked out for every read.
+const std::vector<double>& sources_sum(const Session& s, double t_first, double dt, size_t n, bool ac) {
+    struct Sum {
+        double t_first = 0, dt = 0;
+        bool ac = false;
+        std::vector<signals::SourceParams> sources;
+        std::vector<std::vector<int32_t>> tables;  // copies: the params' tables point here
+        std::vector<double> values;
+        uint64_t used = 0;
+    };
+    constexpr size_t kept = 4;  // AC and DC inputs, and trigger scans, without pushing each other out
+    thread_local std::array<Sum, kept> sums;
+    thread_local uint64_t uses = 0;
+
+    const System& sys = state();
+    const Measurement& m = s.measurement;
+    thread_local std::vector<signals::SourceParams> active;
+    active.clear();
+    for (int module : s.modules) {
+        for (const Channel& src : sys.modules[static_cast<size_t>(module)].sources) {
+            if (src.active == code::on)
+                active.push_back(source_params(src, m.sample_rate));
+        }
+    }
+    const auto same = [&](const Sum& sum) {
+        if (sum.values.size() != n || !same_bits(sum.t_first, t_first) || !same_bits(sum.dt, dt) ||
+            sum.ac != ac || sum.sources.size() != active.size())
+            return false;
+        for (size_t i = 0; i < active.size(); ++i) {
+            const signals::SourceParams &a = active[i], &b = sum.sources[i];
+            if (a.mode != b.mode || a.output != b.output || !same_bits(a.range, b.range) ||
+                !same_bits(a.frequency, b.frequency) || !same_bits(a.phase_deg, b.phase_deg) ||
+                !same_bits(a.duty_cycle, b.duty_cycle) || a.seed != b.seed ||
+                !same_bits(a.ramp_seconds, b.ramp_seconds) || !same_bits(a.sample_rate, b.sample_rate) ||
+                a.block_size != b.block_size || !same_bits(a.amp_scale, b.amp_scale) ||
+                !same_bits(a.active_since, b.active_since) || !std::ranges::equal(a.arb_table, b.arb_table))
+                return false;
+        }
+        return true;
+    };
+    ++uses;
+    for (Sum& sum : sums) {
+        if (same(sum)) {
+            sum.used = uses;
+            return sum.values;
+        }
+    }
+    Sum& sum = *std::ranges::min_element(sums, {}, &Sum::used);
+    sum.used = uses;
+    sum.t_first = t_first;
+    sum.dt = dt;
+    sum.ac = ac;
+    sum.sources = active;
+    sum.tables.resize(active.size());
+    for (size_t i = 0; i < active.size(); ++i) {
+        sum.tables[i].assign(active[i].arb_table.begin(), active[i].arb_table.end());
+        sum.sources[i].arb_table = sum.tables[i];
+    }
+    sum.values.assign(n, 0.0);
+    thread_local std::vector<double> part;
+    part.resize(n);
+    for (const signals::SourceParams& p : active) {
+        signals::render_source(p, t_first, dt, part, ac);
+        for (size_t i = 0; i < n; ++i)
+            sum.values[i] += part[i];
+    }
+    return sum.values;
 }
 
 // The earliest firing of the trigger inputs in samples from .. to - 1, carrying each input's
@@ -243,31 +324,30 @@ void render_input(const Session& s, int32_t id, int64_t first, std::span<double>
     const System& sys = state();
     auto exact = sys.input_samples.find(id);
     if (exact != sys.input_samples.end()) {
+        // The samples repeat: copied in runs up to the end of the stored ones.
         const std::vector<double>& v = exact->second;
-        int64_t size = static_cast<int64_t>(v.size());
-        for (size_t i = 0; i < out.size(); ++i) {
-            int64_t k = (block_aligned ? 0 : first) + static_cast<int64_t>(i);
-            out[i] = v[static_cast<size_t>(((k % size) + size) % size)];
+        const auto size = static_cast<int64_t>(v.size());
+        const int64_t k = block_aligned ? 0 : first;
+        auto from = static_cast<size_t>(((k % size) + size) % size);
+        for (size_t done = 0; done < out.size();) {
+            const size_t run = std::min(out.size() - done, v.size() - from);
+            std::copy_n(v.begin() + static_cast<std::ptrdiff_t>(from), run,
+                        out.begin() + static_cast<std::ptrdiff_t>(done));
+            done += run;
+            from = 0;
         }
         return;
     }
-    std::fill(out.begin(), out.end(), 0.0);
     const Channel* ch = channel_of(s, id);
-    if (!ch)
+    if (!ch) {
+        std::fill(out.begin(), out.end(), 0.0);
         return;
+    }
     const bool ac = ch->input.coupling == code::coupling_ac;
     const double dt = 1.0 / m.sample_rate;
     const double t_first = m.t0 + static_cast<double>(first) * dt;
-    std::vector<double> part(out.size());
-    for (int module : s.modules) {
-        for (const Channel& src : sys.modules[static_cast<size_t>(module)].sources) {
-            if (src.active != code::on)
-                continue;
-            signals::render_source(source_params(src, m.sample_rate), t_first, dt, part, ac);
-            for (size_t i = 0; i < out.size(); ++i)
-                out[i] += part[i];
-        }
-    }
+    const std::vector<double>& sources = sources_sum(s, t_first, dt, out.size(), ac);
+    std::copy(sources.begin(), sources.end(), out.begin());
     signals::add_input_noise(noise_seed(*ch, sys, input_index(*ch)),
                              static_cast<uint64_t>(std::max<int64_t>(0, first)),
                              signals::default_input_noise_rms, out);
@@ -281,7 +361,7 @@ bool take_block(Session& s, int32_t id, double now, std::vector<double>& samples
         return false;
     int64_t& cursor = m.cursor[id];
     int64_t start = m.starts[static_cast<size_t>(cursor - m.first_number)];
-    samples.assign(static_cast<size_t>(m.blocksize), 0.0);
+    samples.resize(static_cast<size_t>(m.blocksize));
     render_input(s, id, start, samples, true);
     ++cursor;
     if (!m.continuous && !m.searching && cursor == m.completed) {
