@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <cstring>
 #include <map>
 #include <memory>
 #include <numbers>
@@ -352,14 +353,29 @@ void add_input_noise(uint32_t channel_seed, uint64_t first_sample_index, double 
 }
 
 bool clip(std::span<double> v, double range) {
+    // Two samples at a time (SSE2 on x86-64), without branches: each pair is cut and the highest
+    // and lowest samples kept; a NaN passes and is not a cut.
+    using Pair = double __attribute__((vector_size(16)));
     const double r = range > 0.0 ? range : 0.0;
-    bool cut_any = false;
-    for (double& x : v) {
-        if (x > r) {
-            x = r;
+    const Pair high = {r, r}, low = {-r, -r};
+    Pair top = low, bottom = high;
+    size_t i = 0;
+    for (; i + 2 <= v.size(); i += 2) {
+        Pair x;
+        std::memcpy(&x, v.data() + i, sizeof x);
+        top = x > top ? x : top;
+        bottom = x < bottom ? x : bottom;
+        x = x > high ? high : x;
+        x = x < low ? low : x;
+        std::memcpy(v.data() + i, &x, sizeof x);
+    }
+    bool cut_any = top[0] > r || top[1] > r || bottom[0] < -r || bottom[1] < -r;
+    for (; i < v.size(); ++i) {
+        if (v[i] > r) {
+            v[i] = r;
             cut_any = true;
-        } else if (x < -r) {
-            x = -r;
+        } else if (v[i] < -r) {
+            v[i] = -r;
             cut_any = true;
         }
     }

@@ -384,3 +384,47 @@ TEST(SimMeasure, ExactSamplesAndAReaderThatFallsBehind) {
     EXPECT_EQ(a, 128);
     EXPECT_EQ(ost7720_blockAvailable(r.s, 1, &a), 0);
 }
+
+TEST(SimMeasure, InputsOfOneBlockSeeTheSameSourcesAndEverySettingChangeAtOnce) {
+    Rig r;
+    r.source(170, 1.0, 1000.0);
+    r.start(341);
+    sim::advance_clock(1024 / fs);
+    const std::vector<double> a = r.read(1), b = r.read(2);
+    // The same sine in both, each with its own 1 mV of noise: the difference has sqrt(2) mV rms.
+    double square = 0;
+    for (size_t i = 0; i < a.size(); ++i)
+        square += (a[i] - b[i]) * (a[i] - b[i]);
+    EXPECT_NEAR(std::sqrt(square / 1024.0), std::sqrt(2.0) * 1e-3, 0.15e-3);
+    EXPECT_NEAR(*std::max_element(a.begin(), a.end()), 1.0, 0.005);
+
+    // Settings changed between the reads of one block count from the next read.
+    ASSERT_EQ(ost7720_setRange(r.s, 4098, 0.5), 0);
+    const std::vector<double> smaller = r.read(3);
+    EXPECT_NEAR(*std::max_element(smaller.begin(), smaller.end()), 0.5, 0.005);
+    ASSERT_EQ(ost7720_setSinePhase(r.s, 4098, 90.0), 0);
+    EXPECT_NEAR(r.read(4)[0], 0.5, 0.005);
+    ASSERT_EQ(ost7720_setSourceOutput(r.s, 4098, 701), 0);  // Grounded
+    const std::vector<double> off = r.read(5);
+    EXPECT_LT(*std::max_element(off.begin(), off.end()), 0.01);
+
+    // An arbitrary table written again with the same size, in place, between two reads.
+    ASSERT_EQ(ost7720_setSourceOutput(r.s, 4098, 700), 0);
+    ASSERT_EQ(ost7720_setSourceMode(r.s, 4098, 176), 0);
+    sim::set_arb_ready_polls(0);
+    for (int32_t level : {1 << 30, -(1 << 29)}) {
+        const std::vector<int32_t> table(1024, level);  // half and minus a quarter of full scale
+        ASSERT_EQ(ost7720_setSrcBufferInit(r.s, 4098, 1), 0);
+        ASSERT_EQ(ost7720_writeSrcBufferData(r.s, 4098, table.data(), 1024, 4), 0);
+        EXPECT_NEAR(r.read_mean(level > 0 ? 6 : 7), level / 2147483648.0 * 0.5, 0.001) << level;
+    }
+    // AC and DC inputs taking turns on one block.
+    ASSERT_EQ(ost7720_setCoupling(r.s, 9, 100), 0);
+    EXPECT_NEAR(r.read_mean(8), -0.125, 0.001);
+    EXPECT_NEAR(r.read_mean(9), 0.0, 0.001);
+    EXPECT_NEAR(r.read_mean(10), -0.125, 0.001);
+    // A source switched off and on again now was not on during the block.
+    ASSERT_EQ(ost7720_setActive(r.s, 4098, 421), 0);
+    ASSERT_EQ(ost7720_setActive(r.s, 4098, 420), 0);
+    EXPECT_NEAR(r.read_mean(11), 0.0, 0.001);
+}
