@@ -97,13 +97,7 @@ const std::vector<double>& sources_sum(const Session& s, double t_first, double 
             sum.ac != ac || sum.sources.size() != active.size())
             return false;
         for (size_t i = 0; i < active.size(); ++i) {
-            const signals::SourceParams &a = active[i], &b = sum.sources[i];
-            if (a.mode != b.mode || a.output != b.output || !same_bits(a.range, b.range) ||
-                !same_bits(a.frequency, b.frequency) || !same_bits(a.phase_deg, b.phase_deg) ||
-                !same_bits(a.duty_cycle, b.duty_cycle) || a.seed != b.seed ||
-                !same_bits(a.ramp_seconds, b.ramp_seconds) || !same_bits(a.sample_rate, b.sample_rate) ||
-                a.block_size != b.block_size || !same_bits(a.amp_scale, b.amp_scale) ||
-                !same_bits(a.active_since, b.active_since) || !std::ranges::equal(a.arb_table, b.arb_table))
+            if (!signals::same_output(active[i], sum.sources[i]))
                 return false;
         }
         return true;

@@ -17,8 +17,10 @@
 //
 // Input signal: the sum of the active sources of the session's modules (loopback), with AC
 // coupling taking off their DC part, plus 1 mV rms of noise seeded per channel, clipped at the
-// input range. Data are generated when read, from the settings of that moment. The ramp rate
-// ramps a source's amplitude up from 0 over that many seconds after it was made active.
+// input range. Data are generated when read, from the settings of that moment (the sources' sum
+// of a block is worked out once and shared by the inputs that read it while those settings hold).
+// The ramp rate ramps a source's amplitude up from 0 over that many seconds after it was made
+// active.
 #pragma once
 
 #include <cstdint>

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <array>
+#include <bit>
 #include <cmath>
 #include <cstring>
 #include <map>
@@ -196,6 +197,18 @@ double cut(double v, double limit) {
 }
 
 }  // namespace
+
+bool same_output(const SourceParams& a, const SourceParams& b) {
+    const auto same = [](double x, double y) {
+        return std::bit_cast<uint64_t>(x) == std::bit_cast<uint64_t>(y);
+    };
+    return a.mode == b.mode && a.output == b.output && same(a.range, b.range) &&
+           same(a.frequency, b.frequency) && same(a.phase_deg, b.phase_deg) &&
+           same(a.duty_cycle, b.duty_cycle) && a.seed == b.seed && same(a.ramp_seconds, b.ramp_seconds) &&
+           same(a.sample_rate, b.sample_rate) && a.block_size == b.block_size &&
+           same(a.amp_scale, b.amp_scale) && same(a.active_since, b.active_since) &&
+           std::ranges::equal(a.arb_table, b.arb_table);
+}
 
 double ramp_gain(const SourceParams& p, double t) {
     if (!(t >= p.active_since)) {

@@ -58,6 +58,10 @@ struct SourceParams {
     double active_since = -std::numeric_limits<double>::infinity();  // seconds, absolute
 };
 
+// True when a and b give the same output at every time: every field equal to the bit (so -0 and 0
+// differ and a NaN equals itself), the tables by content. A new field of SourceParams goes in here.
+bool same_output(const SourceParams& a, const SourceParams& b);
+
 // The source's output at the absolute times t0 + i * dt, i = 0 .. out.size()-1. With ac_coupled
 // the long-run mean of the output (output_mean, scaled by the ramp) is taken off, which is how an
 // AC-coupled input sees a looped-back source: exact, and contiguous blocks still join.
@@ -82,9 +86,9 @@ double ramp_gain(const SourceParams& p, double t);
 // open output.
 double next_period_start(const SourceParams& p, double t);
 
-// Adds reproducible Gaussian noise of `rms` volts: sample i gets the value for the absolute sample
-// index first_sample_index + i of the stream chosen by channel_seed, so contiguous blocks continue
-// the same stream.
+// Adds reproducible, nearly Gaussian noise of `rms` volts (a sum of eight uniform deviates, so it
+// ends at 4.9 x rms): sample i gets the value for the absolute sample index first_sample_index + i
+// of the stream chosen by channel_seed, so contiguous blocks continue the same stream.
 void add_input_noise(uint32_t channel_seed, uint64_t first_sample_index, double rms, std::span<double> out);
 
 // Cuts every sample to -range .. +range (a negative range counts as 0); true when any sample was

@@ -303,3 +303,38 @@ TEST(SimSignals, PeriodStartsFollowTheSourceMode) {
     p.arb_table = table;
     EXPECT_NEAR(sg::next_period_start(p, 0.001), 0.01, 1e-15);
 }
+
+TEST(SimSignals, SameOutputComparesEverySettingAndTheTableByContent) {
+    const std::vector<int32_t> table = swapped_ramp(), copy = table;
+    std::vector<int32_t> changed = table;
+    changed[600] += 1;
+    sg::SourceParams a = source(code::mode_arbitrary);
+    a.arb_table = table;
+    sg::SourceParams b = a;
+    b.arb_table = copy;
+    EXPECT_TRUE(sg::same_output(a, b));
+    const std::vector<void (*)(sg::SourceParams&)> changes = {
+        [](sg::SourceParams& p) { p.mode = code::mode_burst_arbitrary; },
+        [](sg::SourceParams& p) { p.output = code::output_cal; },
+        [](sg::SourceParams& p) { p.range = 1.5; },
+        [](sg::SourceParams& p) { p.frequency = 999.0; },
+        [](sg::SourceParams& p) { p.phase_deg = -0.0; },
+        [](sg::SourceParams& p) { p.duty_cycle = 0.5; },
+        [](sg::SourceParams& p) { p.seed = 2; },
+        [](sg::SourceParams& p) { p.ramp_seconds = 1.0; },
+        [](sg::SourceParams& p) { p.sample_rate = 25600.0; },
+        [](sg::SourceParams& p) { p.block_size = 2048; },
+        [](sg::SourceParams& p) { p.amp_scale = 0.5; },
+        [](sg::SourceParams& p) { p.active_since = 3.0; },
+        [](sg::SourceParams& p) { p.arb_table = p.arb_table.first(1000); }};
+    for (size_t i = 0; i < changes.size(); ++i) {
+        sg::SourceParams c = a;
+        changes[i](c);
+        EXPECT_FALSE(sg::same_output(a, c)) << i;
+    }
+    b.arb_table = changed;
+    EXPECT_FALSE(sg::same_output(a, b));
+    a.frequency = b.frequency = std::numeric_limits<double>::quiet_NaN();
+    b.arb_table = copy;
+    EXPECT_TRUE(sg::same_output(a, b));
+}
