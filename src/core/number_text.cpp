@@ -8,6 +8,10 @@
 #include <cstdio>
 #include <cstring>
 
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
 static_assert(std::endian::native == std::endian::little,
               "the digit text is built in little-endian registers");
 
@@ -25,7 +29,8 @@ __extension__ typedef unsigned __int128 u128;
 // (too small by less than one unit) elsewhere. The table is worked out by the compiler with a
 // small big-integer type, so it costs nothing at run time.
 
-constexpr int pow10_min = -300;  // 10^-300 scales the largest doubles down to 15 digits
+constexpr int pow10_min = -330;  // 10^-300 scales the largest doubles down to 15 digits; the
+                                 // smallest normal binades compare with 10^-323
 constexpr int pow10_max = 340;   // 10^340 scales the smallest subnormals up to 15 digits
 constexpr int exact_pow10_max = 55;
 
@@ -102,6 +107,92 @@ constexpr std::array<Pow10, pow10_max - pow10_min + 1> make_pow10_table() {
 }
 
 constexpr auto pow10_table = make_pow10_table();
+
+// ---------------------------------------------------------------------------------------------
+// The fast pass: one scale per binary exponent.
+//
+// A normal double a in the binade [2^q, 2^(q+1)) is M * 2^(q-63), M its significand normalised
+// to 64 bits. Its 15-digit text has the decimal exponent e with 10^14 <= a * 10^(14-e) rounded
+// to 15 digits < 10^15. The binade fixes e up to one step: e = floor(q * log10 2), plus one when
+// the binade reaches the boundary (10^15 - 1/2) * 10^(e-14), at and above which a rounds to a
+// 15-digit number of the next decade. Per binade the table holds e, both factors
+// 10^(14-e) * 2^(q+14), floored to 64 bits, and the bits of the smallest double at or above the
+// boundary (comparing the bits of positive doubles compares the doubles). The high half of M
+// times the factor is then a * 10^(14-e) with 13 fraction bits, at the same place for every
+// binade: no shift by a variable count, no division by ten, no carry into a 16th digit.
+
+constexpr int scale_fraction_bits = 13;
+
+struct alignas(32) BinadeScale {
+    uint64_t factor[2];  // [1]: for a at or above the threshold
+    uint64_t threshold;  // bits of the smallest double at or above the boundary; or beyond
+    int32_t exp10;       // e below the threshold
+};
+
+// floor(q * log10 2), exact over the double range.
+constexpr int decimal_exponent_of_binade(int q) {
+    return (q * 78913) >> 18;
+}
+
+// floor(10^k * 2^shift) for the fast factor: the table's mantissa moved to 64 bits. Both
+// floors together are one floor, so the factor is short of the true value by less than one.
+constexpr uint64_t scaled_power(int k, int shift) {
+    const Pow10& t = pow10_table[k - pow10_min];
+    const int right = -(t.exp2 + shift);  // 10^k * 2^shift = (hi:lo) >> right
+    if (right < 64 || right > 127)
+        throw "factor out of range";
+    const u128 mantissa = (static_cast<u128>(t.hi) << 64) | t.lo;
+    return static_cast<uint64_t>(mantissa >> right);
+}
+
+// The bits of the smallest double >= (10^16 - 5) * 10^j, the rounding boundary below 10^(j+16).
+// Except for 999999999999999.5, that number is not a double (its odd part exceeds 2^53 or it is
+// not a binary fraction), so this is its top 53 bits plus one. The table's 10^j may be short by
+// less than one unit; the check makes sure that cannot reach the top 53 bits.
+constexpr uint64_t boundary_bits(int j) {
+    if (j == -1)
+        return std::bit_cast<uint64_t>(999999999999999.5);
+    constexpr uint64_t c = 10000000000000000ULL - 5;
+    const Pow10& t = pow10_table[j - pow10_min];
+    // c * (hi:lo) = upper * 2^64 + lower, upper < 2^119
+    const u128 low_product = static_cast<u128>(c) * t.lo;
+    const u128 upper = static_cast<u128>(c) * t.hi + static_cast<uint64_t>(low_product >> 64);
+    const int upper_bits =
+        128 - (static_cast<uint64_t>(upper >> 64) != 0 ? std::countl_zero(static_cast<uint64_t>(upper >> 64))
+                                                       : 64 + std::countl_zero(static_cast<uint64_t>(upper)));
+    const int drop = upper_bits - 53;  // bits of `upper` below the top 53
+    uint64_t top = static_cast<uint64_t>(upper >> drop);
+    const u128 below = upper & ((static_cast<u128>(1) << drop) - 1);
+    if (below + 1 == (static_cast<u128>(1) << drop))
+        throw "boundary too close to call";
+    int exp2 = t.exp2 + 64 + drop + 52;
+    ++top;
+    if (top == uint64_t{1} << 53) {
+        top >>= 1;
+        ++exp2;
+    }
+    return (static_cast<uint64_t>(exp2 + 1023) << 52) | (top & ((uint64_t{1} << 52) - 1));
+}
+
+constexpr std::array<BinadeScale, 2047> make_binade_scales() {
+    std::array<BinadeScale, 2047> table{};
+    for (int biased = 1; biased <= 2046; ++biased) {
+        const int q = biased - 1023;
+        const int e = decimal_exponent_of_binade(q);
+        BinadeScale& s = table[biased];
+        s.factor[0] = scaled_power(14 - e, q + 1 + scale_fraction_bits);
+        s.factor[1] = scaled_power(13 - e, q + 1 + scale_fraction_bits);
+        s.exp10 = e;
+        const uint64_t threshold = boundary_bits(e - 15);
+        const int threshold_biased = static_cast<int>(threshold >> 52);
+        if (threshold_biased < biased)
+            throw "boundary below the binade";
+        s.threshold = threshold_biased == biased ? threshold : ~uint64_t{0};
+    }
+    return table;
+}
+
+constexpr auto binade_scales = make_binade_scales();
 
 constexpr char digit_pairs[201] =
     "00010203040506070809101112131415161718192021222324252627282930313233343536373839"
@@ -230,6 +321,157 @@ Decimal15 round15(double a) {
     return {n, e};
 }
 
+// Correctly rounds a positive normal double, given as its bits, to 15 significant digits.
+// The product falls short of a * 10^(14-e) * 2^13 by less than two units: away from a
+// remainder of one half (4096) by two units, the product decides; the rest, about one value in
+// 4096, take the 128-bit pass. A value just below a power of ten may come out one unit short of
+// 10^14 with a remainder near one: it rounds up to 10^14.
+inline Decimal15 round15_normal(uint64_t bits) {
+    const BinadeScale& s = binade_scales[bits >> 52];
+    const bool above = bits >= s.threshold;
+    const uint64_t m = (bits << 11) | (uint64_t{1} << 63);
+    const uint64_t top = static_cast<uint64_t>((static_cast<u128>(m) * s.factor[above]) >> 64);
+    constexpr uint64_t half = uint64_t{1} << (scale_fraction_bits - 1);
+    constexpr uint64_t fraction_mask = (uint64_t{1} << scale_fraction_bits) - 1;
+    if (((top + 1) & (fraction_mask - 1)) == half) [[unlikely]]  // a remainder of half - 1 or half
+        return round15<true>(std::bit_cast<double>(bits));
+    return {(top + (half - 1)) >> scale_fraction_bits, s.exp10 + above};
+}
+
+// Writes the exponent part, E-05, E+20 or E+308, and returns its length.
+inline int exponent_to(char* out, int e) {
+    out[0] = 'E';
+    out[1] = e < 0 ? '-' : '+';
+    int x = e < 0 ? -e : e;
+    int length = 4;
+    if (x >= 100) {
+        out[2] = static_cast<char>('0' + x / 100);
+        x %= 100;
+        ++out;
+        length = 5;
+    }
+    std::memcpy(out + 2, digit_pairs + 2 * x, 2);
+    return length;
+}
+
+constexpr char sign_char(bool negative) {
+    return negative ? '-' : ' ';
+}
+
+#if defined(__SSE2__)
+
+// The text is built in a vector register and stored whole: 16 characters, the sign first and
+// the 15 digits after it. Storing characters piecemeal and copying them on would make the
+// processor wait for its store buffer.
+
+// The 15 digits of 10^14 <= n < 10^15 as byte values 0..9 in bytes 1..15, byte 0 zero: two
+// 8-digit halves, each split in two by 10^4 (32-bit lanes), then by 100 (16-bit lanes), then by
+// 10 (bytes), all halves at once. The divisions are multiplications by reciprocals that are
+// exact over these ranges; each remainder comes with its quotient from one more multiplication:
+// y * 2^16 + q * (1 - 100 * 2^16) = q + (y - 100 q) * 2^16, likewise for 10 and 2^8.
+// A constant the compiler must keep as it is: it would otherwise turn some multiplications by
+// constants into several shifts and additions, more work than the one multiplication.
+inline __m128i opaque(__m128i v) {
+    __asm__("" : "+x"(v));
+    return v;
+}
+
+inline __m128i digit_values(uint64_t n) {
+    const uint64_t high = n / 100000000;  // 7 digits, so byte 0 comes out zero
+    const uint64_t low = n - high * 100000000;
+    const __m128i halves = _mm_set_epi64x(static_cast<long long>(low), static_cast<long long>(high));
+    const __m128i by_10000 = _mm_srli_epi64(_mm_mul_epu32(halves, _mm_set1_epi64x(0xD1B71759)), 45);
+    const __m128i mod_10000 = _mm_sub_epi32(halves, _mm_mul_epu32(by_10000, _mm_set1_epi64x(10000)));
+    const __m128i quarters = _mm_or_si128(by_10000, _mm_slli_epi64(mod_10000, 32));
+    // Each quarter y < 10^4 in both 16-bit halves of its lane, for the quotient in both.
+    const __m128i high_half = _mm_slli_epi32(quarters, 16);
+    const __m128i by_100 =
+        _mm_srli_epi16(_mm_mulhi_epu16(_mm_or_si128(quarters, high_half), _mm_set1_epi16(5243)), 3);
+    const __m128i pairs =
+        _mm_add_epi16(_mm_mullo_epi16(by_100, opaque(_mm_set1_epi32(0xFF9C0001))), high_half);
+    const __m128i tens = _mm_mulhi_epu16(pairs, _mm_set1_epi16(6554));
+    return _mm_add_epi16(_mm_mullo_epi16(tens, opaque(_mm_set1_epi16(static_cast<short>(0xF601)))),
+                         _mm_slli_epi16(pairs, 8));
+}
+
+struct alignas(16) Bytes16 {
+    uint64_t w[2];
+};
+
+// Byte masks for the point in byte `at` (2..16) of the sign-and-digits text: the bytes before
+// it, the point itself, and the bytes after it (which take the text shifted one place on).
+struct PointMasks {
+    Bytes16 keep;
+    Bytes16 point;
+    Bytes16 shifted;
+};
+
+constexpr std::array<PointMasks, 15> make_point_masks() {
+    std::array<PointMasks, 15> masks{};
+    for (int e = 0; e < 15; ++e) {
+        const int at = e + 2;
+        for (int byte = 0; byte < 16; ++byte) {
+            const uint64_t ones = uint64_t{0xFF} << (8 * (byte % 8));
+            if (byte < at)
+                masks[e].keep.w[byte / 8] |= ones;
+            if (byte == at)
+                masks[e].point.w[byte / 8] |= (ones / 0xFF) * '.';
+            if (byte > at)
+                masks[e].shifted.w[byte / 8] |= ones;
+        }
+    }
+    return masks;
+}
+
+constexpr auto point_masks = make_point_masks();
+
+inline __m128i load(const Bytes16& b) {
+    return _mm_load_si128(reinterpret_cast<const __m128i*>(b.w));
+}
+
+inline void store(char* out, __m128i v) {
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out), v);
+}
+
+// Stores the text with the point after e + 1 digits, 0 <= e < 15: 17 characters, the last from
+// the first store, which the second overwrites up to there.
+inline void store_with_point(char* out, __m128i text, int e) {
+    const PointMasks& m = point_masks[e];
+    store(out + 1, text);
+    const __m128i kept = _mm_and_si128(text, load(m.keep));
+    const __m128i moved = _mm_and_si128(_mm_slli_si128(text, 1), load(m.shifted));
+    store(out, _mm_or_si128(_mm_or_si128(kept, moved), load(m.point)));
+}
+
+// Writes the text of (-1)^negative * n * 10^(e - 14), 10^14 <= n < 10^15, and returns its
+// length. Each case stores 16 characters at a time and counts the ones that belong to the
+// text; the farthest reach is 22 characters from out.
+[[gnu::always_inline]] inline int lay_out(char* out, uint64_t n, int e, bool negative) {
+    const __m128i values = digit_values(n);
+    const unsigned zeros =
+        static_cast<unsigned>(_mm_movemask_epi8(_mm_cmpeq_epi8(values, _mm_setzero_si128())));
+    // Digits up to the last non-zero one (byte 0 is zero, the first digit never).
+    const int count = std::bit_width((zeros ^ 0xFFFFu) | 1u) - 1;
+    const char sign = sign_char(negative);
+    const __m128i text =
+        _mm_or_si128(_mm_add_epi8(values, _mm_set_epi64x(0x3030303030303030, 0x3030303030303000)),
+                     _mm_cvtsi32_si128(sign));
+    if (static_cast<unsigned>(e) < 15) {
+        store_with_point(out, text, e);
+        return count > e + 1 ? count + 2 : e + 2;
+    }
+    if (static_cast<unsigned>(e + 4) < 4) {
+        const uint64_t head = 0x3030303030302E00 | static_cast<unsigned char>(sign);
+        std::memcpy(out, &head, 8);
+        store(out + 1 - e, _mm_srli_si128(text, 1));
+        return 1 - e + count;
+    }
+    const int mantissa = count > 1 ? count + 2 : 2;
+    store_with_point(out, text, 0);
+    return mantissa + exponent_to(out + mantissa, e);
+}
+
+#else
 // The digits of x < 10^8 as eight byte values 0..9, the first digit in the lowest byte: four
 // digits per 32-bit lane, then two per 16-bit lane, then one per byte, all in one register.
 inline uint64_t eight_digits(uint32_t x) {
@@ -301,6 +543,29 @@ inline void store_digits(char* out, const Digits& d) {
     std::memcpy(out, &d.lo, 8);
     std::memcpy(out + 8, &d.hi, 8);
 }
+
+// Writes the text of (-1)^negative * n * 10^(e - 14), 10^14 <= n < 10^15, and returns its
+// length. Each case stores 16 characters at once and counts the ones that belong to the text;
+// the farthest reach is 22 characters from out.
+[[gnu::always_inline]] inline int lay_out(char* out, uint64_t n, int e, bool negative) {
+    const Digits digits = digits_of(n);
+    const int count = digits.count;
+    out[0] = sign_char(negative);
+    if (static_cast<unsigned>(e) < 15) {
+        store_with_point(out + 1, digits, e + 1);
+        return count > e + 1 ? count + 2 : e + 2;
+    }
+    if (static_cast<unsigned>(e + 4) < 4) {
+        std::memcpy(out + 1, ".000", 4);
+        store_digits(out + 1 - e, digits);
+        return 1 - e + count;
+    }
+    const int mantissa = count > 1 ? count + 2 : 2;
+    store_with_point(out + 1, digits, 1);
+    return mantissa + exponent_to(out + mantissa, e);
+}
+
+#endif
 
 bool is_digit(char c) {
     return c >= '0' && c <= '9';
@@ -410,18 +675,15 @@ std::optional<double> round_to_fit(double value, double low, double high) {
     return r;
 }
 
-}  // namespace
-
-int format_to(char* buffer, double value) {
-    const uint64_t bits = std::bit_cast<uint64_t>(value);
-    const bool negative = (bits >> 63) != 0;
+// Zero, subnormals, infinities and NaN: kept out of the inlined common path.
+[[gnu::noinline]] int format_rare(char* out, double value) {
+    const bool negative = std::signbit(value);
     const double a = std::fabs(value);
-    char* out = buffer;
-    if (!(a <= DBL_MAX)) {
-        if (std::isnan(value)) {
-            std::memcpy(out, "NaN", 3);
-            return 3;
-        }
+    if (std::isnan(value)) {
+        std::memcpy(out, "NaN", 3);
+        return 3;
+    }
+    if (a > DBL_MAX) {
         std::memcpy(out, negative ? "-Inf" : " Inf", 4);
         return 4;
     }
@@ -429,39 +691,51 @@ int format_to(char* buffer, double value) {
         std::memcpy(out, " 0", 2);
         return 2;
     }
-    *out++ = negative ? '-' : ' ';
-
     const Decimal15 d = round15<false>(a);
-    const Digits digits = digits_of(d.digits);
-    const int n = digits.count;
-    const int e = d.exp10;
+    return lay_out(out, d.digits, d.exp10, negative);
+}
 
-    // Each case stores 16 characters at once and counts the ones that belong to the text; the
-    // farthest reach is 22 characters from the buffer's start.
-    if (e >= 0 && e < 15) {
-        store_with_point(out, digits, e + 1);
-        out += n > e + 1 ? n + 1 : e + 1;
-    } else if (e < 0 && e >= -4) {
-        std::memcpy(out, ".000", 4);
-        out += -e;
-        store_digits(out, digits);
-        out += n;
-    } else {
-        store_with_point(out, digits, 1);
-        out += n > 1 ? n + 1 : 1;
-        *out++ = 'E';
-        int x = e;
-        *out++ = x < 0 ? '-' : '+';
-        if (x < 0)
-            x = -x;
-        if (x >= 100) {
-            *out++ = static_cast<char>('0' + x / 100);
-            x %= 100;
+inline int format_one(char* out, double value) {
+    const uint64_t bits = std::bit_cast<uint64_t>(value);
+    const uint64_t magnitude = bits & ~(uint64_t{1} << 63);
+    // Biased exponent 0 (zero, subnormals) or 2047 (infinities, NaN).
+    if ((magnitude >> 52) - 1 >= 2046) [[unlikely]]
+        return format_rare(out, value);
+    const Decimal15 d = round15_normal(magnitude);
+    return lay_out(out, d.digits, d.exp10, (bits >> 63) != 0);
+}
+
+}  // namespace
+
+int format_to(char* buffer, double value) {
+    return format_one(buffer, value);
+}
+
+size_t format_lines(char* buffer, const double* values, size_t count, std::string_view before,
+                    std::string_view after) {
+    char* out = buffer;
+    if (before.size() > 8 || after.size() > 8) {
+        for (size_t i = 0; i < count; ++i) {
+            std::memcpy(out, before.data(), before.size());
+            out += before.size();
+            out += format_one(out, values[i]);
+            std::memcpy(out, after.data(), after.size());
+            out += after.size();
         }
-        std::memcpy(out, digit_pairs + 2 * x, 2);
-        out += 2;
+        return static_cast<size_t>(out - buffer);
     }
-    return static_cast<int>(out - buffer);
+    // Both ends are stored as one 8-byte word each; the text overwrites what lies beyond them.
+    uint64_t before_word = 0, after_word = 0;
+    std::memcpy(&before_word, before.data(), before.size());
+    std::memcpy(&after_word, after.data(), after.size());
+    for (size_t i = 0; i < count; ++i) {
+        std::memcpy(out, &before_word, 8);
+        out += before.size();
+        out += format_one(out, values[i]);
+        std::memcpy(out, &after_word, 8);
+        out += after.size();
+    }
+    return static_cast<size_t>(out - buffer);
 }
 
 std::string str(double value) {

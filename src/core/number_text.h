@@ -2,6 +2,7 @@
 // into a number, goes through these.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -21,6 +22,13 @@ std::string text(double value);
 // Writes str(value) at buffer without allocating and returns its length (at most 22); no NUL
 // is added. buffer must hold at least 32 characters: all of them may be used as scratch.
 int format_to(char* buffer, double value);
+
+// One line per value, one after the other at buffer: `before`, the text format_to gives, then
+// `after`. Returns how many characters that took. buffer must hold at least
+// count * (before.size() + 22 + after.size()) + 32 characters: all of them may be used as
+// scratch. For writing many numbers at once, without a call per number.
+size_t format_lines(char* buffer, const double* values, size_t count, std::string_view before,
+                    std::string_view after);
 
 // The number at the start of a text: leading blanks (spaces, tabs, CR, LF) skipped, optional
 // sign, digits with "." as the point, an optional exponent (E or D, either case); 0 when the

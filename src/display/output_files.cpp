@@ -32,13 +32,7 @@ size_t build_lines(const std::vector<double>& samples, size_t first, size_t coun
     char* out = start;
     const size_t end = first + count;
     const size_t held_end = std::clamp(samples.size(), first, end);
-    const double* sample = samples.data();
-    for (size_t k = first; k < held_end; ++k) {
-        *out = '"';
-        out += 1 + numtext::format_to(out + 1, sample[k]);
-        std::memcpy(out, "\"\r\n", 3);
-        out += 3;
-    }
+    out += numtext::format_lines(out, samples.data() + first, held_end - first, "\"", "\"\r\n");
     for (size_t k = held_end; k < end; ++k) {
         std::memcpy(out, "\" 0\"\r\n", 6);
         out += 6;
