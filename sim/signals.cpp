@@ -125,43 +125,56 @@ bool burst_on(const SourceParams& p, int64_t k) {
 }
 
 // The low-pass stage of zoom random: a Hann-weighted moving average, remembering the last taps so
-// consecutive samples draw one new value each. The sum always runs in index order, so the result
-// depends on k alone and not on where a block starts.
+// consecutive samples draw one new value each. The sum is always formed the same way over the same
+// values, so the result depends on k alone and not on where a block starts.
 class ZoomFilter {
   public:
     explicit ZoomFilter(uint64_t stream) : noise_(stream) {
+        std::array<double, zoom_taps> weights{};
         double power = 0.0;
         for (int j = 0; j < zoom_taps; ++j) {
             const double s = std::sin(std::numbers::pi * (j + 1) / (zoom_taps + 1));
-            weights_[j] = s * s;
-            power += weights_[j] * weights_[j];
+            weights[j] = s * s;
+            power += weights[j] * weights[j];
         }
-        for (double& w : weights_) {
-            w /= std::sqrt(power);  // unit variance out for unit variance in
+        for (int j = 0; j < zoom_taps; ++j) {
+            // Unit variance out for unit variance in; oldest value first, as the window runs.
+            reversed_[zoom_taps - 1 - j] = weights[j] / std::sqrt(power);
         }
     }
 
     double at(int64_t k) {
         if (!filled_ || k != last_ + 1) {
-            for (int64_t j = 0; j < zoom_taps; ++j) {
-                ring_[wrap(k - j, zoom_taps)] = noise_.at(static_cast<uint64_t>(k - j));
-            }
+            for (int64_t j = zoom_taps - 1; j >= 0; --j)
+                put(k - j);
             filled_ = true;
         } else {
-            ring_[wrap(k, zoom_taps)] = noise_.at(static_cast<uint64_t>(k));
+            put(k);
         }
         last_ = k;
-        double sum = 0.0;
-        for (int64_t j = 0; j < zoom_taps; ++j) {
-            sum += weights_[j] * ring_[wrap(k - j, zoom_taps)];
+        // The window k - taps + 1 .. k lies in order right after the newest value's first copy.
+        const double* window = ring_.data() + wrap(k, zoom_taps) + 1;
+        // Four partial sums, always added the same way: the result depends on k alone.
+        double sum[4] = {0.0, 0.0, 0.0, 0.0};
+        for (int j = 0; j < zoom_taps; j += 4) {
+            for (int l = 0; l < 4; ++l)
+                sum[l] += reversed_[j + l] * window[j + l];
         }
-        return sum;
+        return (sum[0] + sum[1]) + (sum[2] + sum[3]);
     }
 
   private:
+    // Each value goes in twice, taps apart, so every window is one run of the ring.
+    void put(int64_t k) {
+        const double v = noise_.at(static_cast<uint64_t>(k));
+        const auto at = static_cast<size_t>(wrap(k, zoom_taps));
+        ring_[at] = v;
+        ring_[at + zoom_taps] = v;
+    }
+
     Gaussians noise_;
-    std::array<double, zoom_taps> weights_{};
-    std::array<double, zoom_taps> ring_{};
+    std::array<double, zoom_taps> reversed_{};  // the weights, the oldest value's first
+    std::array<double, 2 * zoom_taps> ring_{};
     int64_t last_ = 0;
     bool filled_ = false;
 };
@@ -281,17 +294,24 @@ void render_source(const SourceParams& p, double t0, double dt, std::span<double
     const double range = peak(p);
     const double noise_rms = range / noise_peak_factor;
 
-    // The waveform at full amplitude, as if always on.
+    const bool burst = is_burst(p.mode) && duty(p) < 1.0;
+    const auto on = [&](int64_t k) { return !burst || burst_on(p, k); };
+
+    // The waveform at full amplitude (the noise forms skip what a burst leaves off).
     if (mode == code::mode_sine) {
         render_sine(range, frequency(p), p.phase_deg / 360.0, t0, dt, out);
     } else if (mode == code::mode_random) {
         Gaussians noise(source_stream(p.seed));
-        for (size_t i = 0; i < n; ++i)
-            out[i] = cut(noise_rms * noise.at(static_cast<uint64_t>(index(i))), range);
+        for (size_t i = 0; i < n; ++i) {
+            const int64_t k = index(i);
+            out[i] = on(k) ? cut(noise_rms * noise.at(static_cast<uint64_t>(k)), range) : 0.0;
+        }
     } else if (mode == code::mode_zoom_random) {
         ZoomFilter zoom(source_stream(p.seed));
-        for (size_t i = 0; i < n; ++i)
-            out[i] = zoom.at(index(i));
+        for (size_t i = 0; i < n; ++i) {
+            const int64_t k = index(i);
+            out[i] = on(k) ? zoom.at(k) : 0.0;
+        }
         if (p.frequency > 0.0) {
             // The shift up to the frequency: sqrt(2) cos(2 pi f t), a quarter turn ahead of the sine.
             std::vector<double> shift(n);
@@ -311,13 +331,12 @@ void render_source(const SourceParams& p, double t0, double dt, std::span<double
     }
 
     // Bursts off, the ramp and the AC coupling's mean.
-    const bool burst = is_burst(p.mode) && duty(p) < 1.0;
     const double mean = ac_coupled ? output_mean(p) : 0.0;
     if (!burst && full && mean == 0.0)
         return;
     for (size_t i = 0; i < n; ++i) {
         const double gain = full ? 1.0 : ramp_gain(p, time(i));
-        const double v = !burst || burst_on(p, index(i)) ? out[i] : 0.0;
+        const double v = on(index(i)) ? out[i] : 0.0;
         out[i] = gain == 0.0 ? 0.0 : gain * (v - mean);
     }
 }
