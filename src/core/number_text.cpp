@@ -443,31 +443,41 @@ inline void store_with_point(char* out, __m128i text, int e) {
     store(out, _mm_or_si128(_mm_or_si128(kept, moved), load(m.point)));
 }
 
-// Writes the text of (-1)^negative * n * 10^(e - 14), 10^14 <= n < 10^15, and returns its
-// length. Each case stores 16 characters at a time and counts the ones that belong to the
-// text; the farthest reach is 22 characters from out.
-[[gnu::always_inline]] inline int lay_out(char* out, uint64_t n, int e, bool negative) {
+// A number's characters before the point goes in: the sign and the 15 digits, and how many
+// digits remain without the trailing zeros.
+struct Text {
+    __m128i chars;  // the sign in byte 0, the digits in bytes 1..15
+    int count;
+};
+
+[[gnu::always_inline]] inline Text text_of(uint64_t n, bool negative) {
     const __m128i values = digit_values(n);
     const unsigned zeros =
         static_cast<unsigned>(_mm_movemask_epi8(_mm_cmpeq_epi8(values, _mm_setzero_si128())));
     // Digits up to the last non-zero one (byte 0 is zero, the first digit never).
     const int count = std::bit_width((zeros ^ 0xFFFFu) | 1u) - 1;
-    const char sign = sign_char(negative);
-    const __m128i text =
+    const __m128i chars =
         _mm_or_si128(_mm_add_epi8(values, _mm_set_epi64x(0x3030303030303030, 0x3030303030303000)),
-                     _mm_cvtsi32_si128(sign));
+                     _mm_cvtsi32_si128(sign_char(negative)));
+    return {chars, count};
+}
+
+// Writes the text of t * 10^(e - 14) and returns its length. Each case stores 16 characters at
+// a time and counts the ones that belong to the text; the farthest reach is 22 characters from
+// out.
+[[gnu::always_inline]] inline int place(char* out, const Text& t, int e) {
     if (static_cast<unsigned>(e) < 15) {
-        store_with_point(out, text, e);
-        return count > e + 1 ? count + 2 : e + 2;
+        store_with_point(out, t.chars, e);
+        return t.count > e + 1 ? t.count + 2 : e + 2;
     }
     if (static_cast<unsigned>(e + 4) < 4) {
-        const uint64_t head = 0x3030303030302E00 | static_cast<unsigned char>(sign);
+        const uint64_t head = 0x3030303030302E00 | static_cast<unsigned>(_mm_cvtsi128_si32(t.chars) & 0xFF);
         std::memcpy(out, &head, 8);
-        store(out + 1 - e, _mm_srli_si128(text, 1));
-        return 1 - e + count;
+        store(out + 1 - e, _mm_srli_si128(t.chars, 1));
+        return 1 - e + t.count;
     }
-    const int mantissa = count > 1 ? count + 2 : 2;
-    store_with_point(out, text, 0);
+    const int mantissa = t.count > 1 ? t.count + 2 : 2;
+    store_with_point(out, t.chars, 0);
     return mantissa + exponent_to(out + mantissa, e);
 }
 
@@ -544,24 +554,33 @@ inline void store_digits(char* out, const Digits& d) {
     std::memcpy(out + 8, &d.hi, 8);
 }
 
-// Writes the text of (-1)^negative * n * 10^(e - 14), 10^14 <= n < 10^15, and returns its
-// length. Each case stores 16 characters at once and counts the ones that belong to the text;
-// the farthest reach is 22 characters from out.
-[[gnu::always_inline]] inline int lay_out(char* out, uint64_t n, int e, bool negative) {
-    const Digits digits = digits_of(n);
-    const int count = digits.count;
-    out[0] = sign_char(negative);
+// A number's characters before the point goes in.
+struct Text {
+    Digits digits;
+    char sign;
+};
+
+[[gnu::always_inline]] inline Text text_of(uint64_t n, bool negative) {
+    return {digits_of(n), sign_char(negative)};
+}
+
+// Writes the text of t * 10^(e - 14) and returns its length. Each case stores 16 characters at
+// once and counts the ones that belong to the text; the farthest reach is 22 characters from
+// out.
+[[gnu::always_inline]] inline int place(char* out, const Text& t, int e) {
+    const int count = t.digits.count;
+    out[0] = t.sign;
     if (static_cast<unsigned>(e) < 15) {
-        store_with_point(out + 1, digits, e + 1);
+        store_with_point(out + 1, t.digits, e + 1);
         return count > e + 1 ? count + 2 : e + 2;
     }
     if (static_cast<unsigned>(e + 4) < 4) {
         std::memcpy(out + 1, ".000", 4);
-        store_digits(out + 1 - e, digits);
+        store_digits(out + 1 - e, t.digits);
         return 1 - e + count;
     }
     const int mantissa = count > 1 ? count + 2 : 2;
-    store_with_point(out + 1, digits, 1);
+    store_with_point(out + 1, t.digits, 1);
     return mantissa + exponent_to(out + mantissa, e);
 }
 
@@ -692,17 +711,23 @@ std::optional<double> round_to_fit(double value, double low, double high) {
         return 2;
     }
     const Decimal15 d = round15<false>(a);
-    return lay_out(out, d.digits, d.exp10, negative);
+    return place(out, text_of(d.digits, negative), d.exp10);
 }
 
-inline int format_one(char* out, double value) {
+constexpr uint64_t sign_bit = uint64_t{1} << 63;
+
+// Biased exponent 0 (zero, subnormals) or 2047 (infinities, NaN).
+inline bool is_rare(uint64_t magnitude) {
+    return (magnitude >> 52) - 1 >= 2046;
+}
+
+[[gnu::always_inline]] inline int format_one(char* out, double value) {
     const uint64_t bits = std::bit_cast<uint64_t>(value);
-    const uint64_t magnitude = bits & ~(uint64_t{1} << 63);
-    // Biased exponent 0 (zero, subnormals) or 2047 (infinities, NaN).
-    if ((magnitude >> 52) - 1 >= 2046) [[unlikely]]
+    const uint64_t magnitude = bits & ~sign_bit;
+    if (is_rare(magnitude)) [[unlikely]]
         return format_rare(out, value);
     const Decimal15 d = round15_normal(magnitude);
-    return lay_out(out, d.digits, d.exp10, (bits >> 63) != 0);
+    return place(out, text_of(d.digits, (bits & sign_bit) != 0), d.exp10);
 }
 
 }  // namespace
@@ -724,16 +749,34 @@ size_t format_lines(char* buffer, const double* values, size_t count, std::strin
         }
         return static_cast<size_t>(out - buffer);
     }
-    // Both ends are stored as one 8-byte word each; the text overwrites what lies beyond them.
+    // Both ends are stored as one 8-byte word each; what follows overwrites the rest.
     uint64_t before_word = 0, after_word = 0;
     std::memcpy(&before_word, before.data(), before.size());
     std::memcpy(&after_word, after.data(), after.size());
-    for (size_t i = 0; i < count; ++i) {
-        std::memcpy(out, &before_word, 8);
-        out += before.size();
-        out += format_one(out, values[i]);
-        std::memcpy(out, &after_word, 8);
-        out += after.size();
+    // A batch at a time: the roundings, then the digits, then the texts. The chain of work from
+    // a number to its text is long, and the processor overlaps only a few such chains; each step
+    // alone is short, so it overlaps many numbers. This makes a block about a third faster.
+    constexpr size_t batch = 64;
+    constexpr int rare = 1000;  // exponent mark: the number is written by format_rare
+    Decimal15 decimals[batch];
+    Text texts[batch];
+    for (size_t first = 0; first < count; first += batch) {
+        const double* v = values + first;
+        const size_t n = std::min(batch, count - first);
+        for (size_t i = 0; i < n; ++i) {
+            const uint64_t magnitude = std::bit_cast<uint64_t>(v[i]) & ~sign_bit;
+            decimals[i] = is_rare(magnitude) ? Decimal15{ten14, rare} : round15_normal(magnitude);
+        }
+        for (size_t i = 0; i < n; ++i)
+            texts[i] = text_of(decimals[i].digits, (std::bit_cast<uint64_t>(v[i]) & sign_bit) != 0);
+        for (size_t i = 0; i < n; ++i) {
+            std::memcpy(out, &before_word, 8);
+            out += before.size();
+            const int e = decimals[i].exp10;
+            out += e != rare ? place(out, texts[i], e) : format_rare(out, v[i]);
+            std::memcpy(out, &after_word, 8);
+            out += after.size();
+        }
     }
     return static_cast<size_t>(out - buffer);
 }
