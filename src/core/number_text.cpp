@@ -174,8 +174,14 @@ constexpr uint64_t boundary_bits(int j) {
     return (static_cast<uint64_t>(exp2 + 1023) << 52) | (top & ((uint64_t{1} << 52) - 1));
 }
 
-constexpr std::array<BinadeScale, 2047> make_binade_scales() {
-    std::array<BinadeScale, 2047> table{};
+// The exponent that marks zero, subnormals, infinities and NaN (biased exponents 0 and 2047):
+// their factor of zero makes the fast pass decide at once, and the text goes to format_rare.
+constexpr int rare_exponent = 1000;
+
+constexpr std::array<BinadeScale, 2048> make_binade_scales() {
+    std::array<BinadeScale, 2048> table{};
+    for (int biased : {0, 2047})
+        table[biased] = {{0, 0}, ~uint64_t{0}, rare_exponent};
     for (int biased = 1; biased <= 2046; ++biased) {
         const int q = biased - 1023;
         const int e = decimal_exponent_of_binade(q);
@@ -321,7 +327,8 @@ Decimal15 round15(double a) {
     return {n, e};
 }
 
-// Correctly rounds a positive normal double, given as its bits, to 15 significant digits.
+// Correctly rounds a positive double, given as its bits, to 15 significant digits; for a rare
+// number (zero, subnormal, infinity, NaN) the exponent comes out as rare_exponent.
 // The product falls short of a * 10^(14-e) * 2^13 by less than two units: away from a
 // remainder of one half (4096) by two units, the product decides; the rest, about one value in
 // 4096, take the 128-bit pass. A value just below a power of ten may come out one unit short of
@@ -354,6 +361,8 @@ inline int exponent_to(char* out, int e) {
     return length;
 }
 
+int format_rare(char* out, double value);
+
 constexpr char sign_char(bool negative) {
     return negative ? '-' : ' ';
 }
@@ -364,11 +373,6 @@ constexpr char sign_char(bool negative) {
 // the 15 digits after it. Storing characters piecemeal and copying them on would make the
 // processor wait for its store buffer.
 
-// The 15 digits of 10^14 <= n < 10^15 as byte values 0..9 in bytes 1..15, byte 0 zero: two
-// 8-digit halves, each split in two by 10^4 (32-bit lanes), then by 100 (16-bit lanes), then by
-// 10 (bytes), all halves at once. The divisions are multiplications by reciprocals that are
-// exact over these ranges; each remainder comes with its quotient from one more multiplication:
-// y * 2^16 + q * (1 - 100 * 2^16) = q + (y - 100 q) * 2^16, likewise for 10 and 2^8.
 // A constant the compiler must keep as it is: it would otherwise turn some multiplications by
 // constants into several shifts and additions, more work than the one multiplication.
 inline __m128i opaque(__m128i v) {
@@ -376,6 +380,11 @@ inline __m128i opaque(__m128i v) {
     return v;
 }
 
+// The 15 digits of 10^14 <= n < 10^15 as byte values 0..9 in bytes 1..15, byte 0 zero: two
+// 8-digit halves, each split in two by 10^4 (32-bit lanes), then by 100 (16-bit lanes), then by
+// 10 (bytes), all halves at once. The divisions are multiplications by reciprocals that are
+// exact over these ranges; each remainder comes with its quotient from one more multiplication:
+// y * 2^16 + q * (1 - 100 * 2^16) = q + (y - 100 q) * 2^16, likewise for 10 and 2^8.
 inline __m128i digit_values(uint64_t n) {
     const uint64_t high = n / 100000000;  // 7 digits, so byte 0 comes out zero
     const uint64_t low = n - high * 100000000;
@@ -397,6 +406,19 @@ inline __m128i digit_values(uint64_t n) {
 struct alignas(16) Bytes16 {
     uint64_t w[2];
 };
+
+inline __m128i load(const Bytes16& b) {
+    return _mm_load_si128(reinterpret_cast<const __m128i*>(b.w));
+}
+
+inline void store(char* out, __m128i v) {
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(out), v);
+}
+
+// What turns the digit values into characters, the sign in byte 0: for a positive and for a
+// negative number.
+constexpr Bytes16 to_characters[2] = {{0x3030303030303000 | ' ', 0x3030303030303030},
+                                      {0x3030303030303000 | '-', 0x3030303030303030}};
 
 // Byte masks for the point in byte `at` (2..16) of the sign-and-digits text: the bytes before
 // it, the point itself, and the bytes after it (which take the text shifted one place on).
@@ -425,14 +447,6 @@ constexpr std::array<PointMasks, 15> make_point_masks() {
 
 constexpr auto point_masks = make_point_masks();
 
-inline __m128i load(const Bytes16& b) {
-    return _mm_load_si128(reinterpret_cast<const __m128i*>(b.w));
-}
-
-inline void store(char* out, __m128i v) {
-    _mm_storeu_si128(reinterpret_cast<__m128i*>(out), v);
-}
-
 // Stores the text with the point after e + 1 digits, 0 <= e < 15: 17 characters, the last from
 // the first store, which the second overwrites up to there.
 inline void store_with_point(char* out, __m128i text, int e) {
@@ -452,20 +466,18 @@ struct Text {
 
 [[gnu::always_inline]] inline Text text_of(uint64_t n, bool negative) {
     const __m128i values = digit_values(n);
-    const unsigned zeros =
-        static_cast<unsigned>(_mm_movemask_epi8(_mm_cmpeq_epi8(values, _mm_setzero_si128())));
-    // Digits up to the last non-zero one (byte 0 is zero, the first digit never).
-    const int count = std::bit_width((zeros ^ 0xFFFFu) | 1u) - 1;
-    const __m128i chars =
-        _mm_or_si128(_mm_add_epi8(values, _mm_set_epi64x(0x3030303030303030, 0x3030303030303000)),
-                     _mm_cvtsi32_si128(sign_char(negative)));
-    return {chars, count};
+    // The last non-zero digit (byte 0 is zero, the first digit never; the 1 keeps the count
+    // defined for the rare numbers, whose n is not a 15-digit number).
+    const unsigned nonzero =
+        static_cast<unsigned>(_mm_movemask_epi8(_mm_cmpgt_epi8(values, _mm_setzero_si128())));
+    const int count = 31 - std::countl_zero(nonzero | 1u);
+    return {_mm_add_epi8(values, load(to_characters[negative])), count};
 }
 
-// Writes the text of t * 10^(e - 14) and returns its length. Each case stores 16 characters at
-// a time and counts the ones that belong to the text; the farthest reach is 22 characters from
-// out.
-[[gnu::always_inline]] inline int place(char* out, const Text& t, int e) {
+// Writes the text of t * 10^(e - 14) and returns its length; a rare number (e is rare_exponent)
+// goes to format_rare. Each case stores 16 characters at a time and counts the ones that belong
+// to the text; the farthest reach is 22 characters from out.
+[[gnu::always_inline]] inline int place(char* out, const Text& t, int e, double value) {
     if (static_cast<unsigned>(e) < 15) {
         store_with_point(out, t.chars, e);
         return t.count > e + 1 ? t.count + 2 : e + 2;
@@ -476,6 +488,8 @@ struct Text {
         store(out + 1 - e, _mm_srli_si128(t.chars, 1));
         return 1 - e + t.count;
     }
+    if (e == rare_exponent) [[unlikely]]
+        return format_rare(out, value);
     const int mantissa = t.count > 1 ? t.count + 2 : 2;
     store_with_point(out, t.chars, 0);
     return mantissa + exponent_to(out + mantissa, e);
@@ -564,10 +578,12 @@ struct Text {
     return {digits_of(n), sign_char(negative)};
 }
 
-// Writes the text of t * 10^(e - 14) and returns its length. Each case stores 16 characters at
-// once and counts the ones that belong to the text; the farthest reach is 22 characters from
-// out.
-[[gnu::always_inline]] inline int place(char* out, const Text& t, int e) {
+// Writes the text of t * 10^(e - 14) and returns its length; a rare number (e is rare_exponent)
+// goes to format_rare. Each case stores 16 characters at once and counts the ones that belong
+// to the text; the farthest reach is 22 characters from out.
+[[gnu::always_inline]] inline int place(char* out, const Text& t, int e, double value) {
+    if (e == rare_exponent) [[unlikely]]
+        return format_rare(out, value);
     const int count = t.digits.count;
     out[0] = t.sign;
     if (static_cast<unsigned>(e) < 15) {
@@ -711,23 +727,15 @@ std::optional<double> round_to_fit(double value, double low, double high) {
         return 2;
     }
     const Decimal15 d = round15<false>(a);
-    return place(out, text_of(d.digits, negative), d.exp10);
+    return place(out, text_of(d.digits, negative), d.exp10, value);
 }
 
 constexpr uint64_t sign_bit = uint64_t{1} << 63;
 
-// Biased exponent 0 (zero, subnormals) or 2047 (infinities, NaN).
-inline bool is_rare(uint64_t magnitude) {
-    return (magnitude >> 52) - 1 >= 2046;
-}
-
 [[gnu::always_inline]] inline int format_one(char* out, double value) {
     const uint64_t bits = std::bit_cast<uint64_t>(value);
-    const uint64_t magnitude = bits & ~sign_bit;
-    if (is_rare(magnitude)) [[unlikely]]
-        return format_rare(out, value);
-    const Decimal15 d = round15_normal(magnitude);
-    return place(out, text_of(d.digits, (bits & sign_bit) != 0), d.exp10);
+    const Decimal15 d = round15_normal(bits & ~sign_bit);
+    return place(out, text_of(d.digits, (bits & sign_bit) != 0), d.exp10, value);
 }
 
 }  // namespace
@@ -757,23 +765,19 @@ size_t format_lines(char* buffer, const double* values, size_t count, std::strin
     // a number to its text is long, and the processor overlaps only a few such chains; each step
     // alone is short, so it overlaps many numbers. This makes a block about a third faster.
     constexpr size_t batch = 64;
-    constexpr int rare = 1000;  // exponent mark: the number is written by format_rare
     Decimal15 decimals[batch];
     Text texts[batch];
     for (size_t first = 0; first < count; first += batch) {
         const double* v = values + first;
         const size_t n = std::min(batch, count - first);
-        for (size_t i = 0; i < n; ++i) {
-            const uint64_t magnitude = std::bit_cast<uint64_t>(v[i]) & ~sign_bit;
-            decimals[i] = is_rare(magnitude) ? Decimal15{ten14, rare} : round15_normal(magnitude);
-        }
+        for (size_t i = 0; i < n; ++i)
+            decimals[i] = round15_normal(std::bit_cast<uint64_t>(v[i]) & ~sign_bit);
         for (size_t i = 0; i < n; ++i)
             texts[i] = text_of(decimals[i].digits, (std::bit_cast<uint64_t>(v[i]) & sign_bit) != 0);
         for (size_t i = 0; i < n; ++i) {
             std::memcpy(out, &before_word, 8);
             out += before.size();
-            const int e = decimals[i].exp10;
-            out += e != rare ? place(out, texts[i], e) : format_rare(out, v[i]);
+            out += place(out, texts[i], decimals[i].exp10, v[i]);
             std::memcpy(out, &after_word, 8);
             out += after.size();
         }
