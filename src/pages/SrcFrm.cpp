@@ -167,6 +167,14 @@ void SrcFrm::size_controls() {
         twips::set_width(b, button_w);
         twips::set_height(b, twips::height(doneBtn));
     }
+    // In windows below about 730 pixels the last grid row reaches down to where OK and Cancel
+    // stand: they move down just below it, as far as the window allows.
+    const double clear_top = twips::top(SrcTrigCmbo) + twips::height(SrcTrigCmbo) + 4 * twips_per_pixel_y();
+    if (twips::top(doneBtn) < clear_top) {
+        const double top = std::min(clear_top, ScaleHeight() - twips::height(doneBtn));
+        twips::set_top(doneBtn, top);
+        twips::set_top(cancelBtn, top);
+    }
     // The hint box takes the rest of the second column down to a small margin at the bottom.
     twips::set_width(NoteTxt, ScaleWidth() - twips::left(NoteTxt) - cu / 2);
     twips::set_height(NoteTxt, ScaleHeight() - twips::top(NoteTxt) - 4 * twips_per_pixel_y());
