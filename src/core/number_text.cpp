@@ -363,10 +363,6 @@ inline int exponent_to(char* out, int e) {
 
 int format_rare(char* out, double value);
 
-constexpr char sign_char(bool negative) {
-    return negative ? '-' : ' ';
-}
-
 #if defined(__SSE2__)
 
 // The text is built in a vector register and stored whole: 16 characters, the sign first and
@@ -573,6 +569,10 @@ struct Text {
     Digits digits;
     char sign;
 };
+
+constexpr char sign_char(bool negative) {
+    return negative ? '-' : ' ';
+}
 
 [[gnu::always_inline]] inline Text text_of(uint64_t n, bool negative) {
     return {digits_of(n), sign_char(negative)};

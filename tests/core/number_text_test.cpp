@@ -185,6 +185,69 @@ TEST(StandardText, MatchesCorrectlyRoundedReferenceOnRandomValues) {
     }
 }
 
+TEST(StandardText, RoundingBoundaryBelowEachPowerOfTenAcrossTheRange) {
+    // 999999999999999.5 * 10^j is where a number's 15-digit text moves to the next decade: just
+    // below it the text has fifteen 9s, at or above it the text is a power of ten. Both sides,
+    // and the powers of ten themselves, a few units in the last place either way.
+    for (int j = -338; j <= 293; ++j) {
+        for (const char* form : {"999999999999999.5e%d", "1e%d"}) {
+            char text[32];
+            std::snprintf(text, sizeof text, form, form[0] == '1' ? j + 15 : j);
+            const double boundary = std::strtod(text, nullptr);
+            if (boundary == 0 || !std::isfinite(boundary))
+                continue;
+            double v = boundary;
+            for (int step = 0; step < 3; ++step)
+                v = std::nextafter(v, 0.0);
+            for (int step = 0; step < 7; ++step, v = std::nextafter(v, INFINITY))
+                if (std::isfinite(v))
+                    expect_reference(v);
+        }
+    }
+    EXPECT_EQ(str(999999999999999.5), " 1E+15");
+    EXPECT_EQ(str(99999999999999.95), " 100000000000000");
+    EXPECT_EQ(str(std::nextafter(99999999999999.95, 0.0)), " 99999999999999.9");
+}
+
+TEST(FormatLines, SameTextsAsFormatToBetweenAnyEndsWithinTheBuffer) {
+    std::mt19937_64 rng(4242);
+    const std::vector<double> specials = {0.0,          -0.0,         NAN,  INFINITY,          -INFINITY,
+                                          DBL_TRUE_MIN, -DBL_MIN / 3, 1E15, 999999999999999.5, 1E-05,
+                                          0.0001,       -1E300};
+    const std::vector<std::string> ends = {"", "\"", "\"\r\n", "12345678", "123456789", "<value is>"};
+    for (int run = 0; run < 300; ++run) {
+        // Up to a few batches, with every kind of number anywhere in them.
+        std::vector<double> values(rng() % 300);
+        for (double& v : values) {
+            switch (rng() % 4) {
+                case 0:
+                    v = specials[rng() % specials.size()];
+                    break;
+                case 1:
+                    v = std::bit_cast<double>(rng());
+                    break;
+                default:
+                    v = (static_cast<double>(rng() % 2000001) - 1E6) /
+                        std::pow(10.0, static_cast<int>(rng() % 12));
+            }
+        }
+        const std::string& before = ends[rng() % ends.size()];
+        const std::string& after = ends[rng() % ends.size()];
+        std::string want;
+        for (double v : values) {
+            char text[32];
+            want += before + std::string(text, static_cast<size_t>(numtext::format_to(text, v))) + after;
+        }
+        const size_t room = values.size() * (before.size() + 22 + after.size()) + 32;
+        std::vector<char> buffer(room + 16, '#');
+        const size_t length =
+            numtext::format_lines(buffer.data(), values.data(), values.size(), before, after);
+        ASSERT_EQ(std::string(buffer.data(), length), want) << "run " << run;
+        for (size_t i = room; i < buffer.size(); ++i)
+            ASSERT_EQ(buffer[i], '#') << "wrote past the buffer in run " << run;
+    }
+}
+
 TEST(StandardText, ExactPathDoesNotDependOnTheLocalesPoint) {
     // 10000000000000050 is an exact half that only the exact path can decide.
     const std::string saved = std::setlocale(LC_NUMERIC, nullptr);

@@ -9,6 +9,7 @@
 #include <sys/resource.h>
 #include <unistd.h>
 
+#include <cmath>
 #include <csignal>
 #include <cstdlib>
 #include <filesystem>
@@ -337,6 +338,28 @@ TEST_F(OutputFilesTest, BlocksAboveThe16BitRangeWriteEveryLine) {
         const std::string want = k < 100000 ? "\" " + std::to_string(k) + "\"" : "\" 0\"";
         ASSERT_EQ(both[65537 + k], want) << "line " << k;
     }
+    EXPECT_TRUE(messages.empty());
+}
+
+TEST_F(OutputFilesTest, EveryKindOfNumberAnywhereInABlockIsItsStandardText) {
+    // The block is formatted many numbers at a time; numbers of every form, and those that take
+    // a slower way (zero, infinities, NaN, subnormals), at every place within those batches.
+    const std::vector<double> kinds = {1.5,  -2.0,    0.0,   -0.0,     1E-20,     0.00012, -.25,
+                                       1E15, 1E-300,  NAN,   INFINITY, -INFINITY, 5E-324,  123456789012345.0,
+                                       -7.1, 2.0 / 3, 1E-05, 99.5};
+    std::vector<double> samples;
+    for (int k = 0; k < 1000; ++k)
+        samples.push_back(k % 7 == 0 ? kinds[static_cast<size_t>(k / 7) % kinds.size()] : std::sin(k) * 8.0);
+    global::num_points = static_cast<int32_t>(samples.size());
+    set_trace(0, samples, path("kinds.txt"));
+    write(global::flag_false);
+    const std::vector<std::string> lines = split_crlf_lines(contents(path("kinds.txt")));
+    ASSERT_EQ(lines.size(), samples.size() + 1);
+    for (size_t k = 0; k < samples.size(); ++k)
+        ASSERT_EQ(lines[k], "\"" + numtext::str(samples[k]) + "\"") << "line " << k;
+    EXPECT_EQ(lines[7], "\"-2\"");
+    EXPECT_EQ(lines[63], "\"NaN\"");
+    EXPECT_EQ(lines[77], "\"-Inf\"");
     EXPECT_TRUE(messages.empty());
 }
 
