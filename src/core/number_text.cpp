@@ -115,11 +115,13 @@ constexpr auto pow10_table = make_pow10_table();
 // to 64 bits. Its 15-digit text has the decimal exponent e with 10^14 <= a * 10^(14-e) rounded
 // to 15 digits < 10^15. The binade fixes e up to one step: e = floor(q * log10 2), plus one when
 // the binade reaches the boundary (10^15 - 1/2) * 10^(e-14), at and above which a rounds to a
-// 15-digit number of the next decade. Per binade the table holds e, both factors
-// 10^(14-e) * 2^(q+14), floored to 64 bits, and the bits of the smallest double at or above the
-// boundary (comparing the bits of positive doubles compares the doubles). The high half of M
-// times the factor is then a * 10^(14-e) with 13 fraction bits, at the same place for every
-// binade: no shift by a variable count, no division by ten, no carry into a 16th digit.
+// 15-digit number of the next decade. Per binade the table holds e, the factors
+// 10^(14-e) * 2^(q+14) and one tenth of it, floored to 64 bits, and the bits of the smallest
+// double at or above the boundary (comparing the bits of positive doubles compares the
+// doubles). The high half of M times the factor is then a * 10^(14-e) with 13 fraction bits, at
+// the same place for every binade: no shift by a variable count, no division by ten, no carry
+// into a 16th digit. The table is worked out by the compiler; a check that fails (a throw)
+// stops the compilation.
 
 constexpr int scale_fraction_bits = 13;
 
@@ -333,7 +335,7 @@ Decimal15 round15(double a) {
 // remainder of one half (4096) by two units, the product decides; the rest, about one value in
 // 4096, take the 128-bit pass. A value just below a power of ten may come out one unit short of
 // 10^14 with a remainder near one: it rounds up to 10^14.
-inline Decimal15 round15_normal(uint64_t bits) {
+inline Decimal15 round15_fast(uint64_t bits) {
     const BinadeScale& s = binade_scales[bits >> 52];
     const bool above = bits >= s.threshold;
     const uint64_t m = (bits << 11) | (uint64_t{1} << 63);
@@ -491,7 +493,8 @@ struct Text {
     return mantissa + exponent_to(out + mantissa, e);
 }
 
-#else
+#else  // Without SSE2: the same in 64-bit registers.
+
 // The digits of x < 10^8 as eight byte values 0..9, the first digit in the lowest byte: four
 // digits per 32-bit lane, then two per 16-bit lane, then one per byte, all in one register.
 inline uint64_t eight_digits(uint32_t x) {
@@ -734,7 +737,7 @@ constexpr uint64_t sign_bit = uint64_t{1} << 63;
 
 [[gnu::always_inline]] inline int format_one(char* out, double value) {
     const uint64_t bits = std::bit_cast<uint64_t>(value);
-    const Decimal15 d = round15_normal(bits & ~sign_bit);
+    const Decimal15 d = round15_fast(bits & ~sign_bit);
     return place(out, text_of(d.digits, (bits & sign_bit) != 0), d.exp10, value);
 }
 
@@ -747,20 +750,25 @@ int format_to(char* buffer, double value) {
 size_t format_lines(char* buffer, const double* values, size_t count, std::string_view before,
                     std::string_view after) {
     char* out = buffer;
+    const auto append = [&out](std::string_view s) {
+        if (!s.empty())
+            std::memcpy(out, s.data(), s.size());
+        out += s.size();
+    };
     if (before.size() > 8 || after.size() > 8) {
         for (size_t i = 0; i < count; ++i) {
-            std::memcpy(out, before.data(), before.size());
-            out += before.size();
+            append(before);
             out += format_one(out, values[i]);
-            std::memcpy(out, after.data(), after.size());
-            out += after.size();
+            append(after);
         }
         return static_cast<size_t>(out - buffer);
     }
     // Both ends are stored as one 8-byte word each; what follows overwrites the rest.
     uint64_t before_word = 0, after_word = 0;
-    std::memcpy(&before_word, before.data(), before.size());
-    std::memcpy(&after_word, after.data(), after.size());
+    if (!before.empty())
+        std::memcpy(&before_word, before.data(), before.size());
+    if (!after.empty())
+        std::memcpy(&after_word, after.data(), after.size());
     // A batch at a time: the roundings, then the digits, then the texts. The chain of work from
     // a number to its text is long, and the processor overlaps only a few such chains; each step
     // alone is short, so it overlaps many numbers. This makes a block about a third faster.
@@ -771,7 +779,7 @@ size_t format_lines(char* buffer, const double* values, size_t count, std::strin
         const double* v = values + first;
         const size_t n = std::min(batch, count - first);
         for (size_t i = 0; i < n; ++i)
-            decimals[i] = round15_normal(std::bit_cast<uint64_t>(v[i]) & ~sign_bit);
+            decimals[i] = round15_fast(std::bit_cast<uint64_t>(v[i]) & ~sign_bit);
         for (size_t i = 0; i < n; ++i)
             texts[i] = text_of(decimals[i].digits, (std::bit_cast<uint64_t>(v[i]) & sign_bit) != 0);
         for (size_t i = 0; i < n; ++i) {
