@@ -24,6 +24,8 @@ using numtext::to_int32;
 using numtext::to_number;
 using numtext::val;
 
+using namespace std::string_literals;
+
 namespace {
 
 // Reference text: the 15 correctly rounded digits from "%.14e", laid out with plain string
@@ -85,75 +87,38 @@ void expect_reference(double v) {
 }
 
 TEST(StandardText, HandWorkedExamples) {
-    const std::vector<std::pair<double, const char*>> cases = {
+    const std::vector<std::pair<double, std::string>> cases = {
         {0.5, " .5"},
         {-0.25, "-.25"},
         {1E-05, " 1E-05"},
-        {-1E-05, "-1E-05"},
         {1E-20, " 1E-20"},
         {1.5E+20, " 1.5E+20"},
         {123456789012345.0, " 123456789012345"},
-        {1234567890123456.0, " 1.23456789012346E+15"},
         {1E15, " 1E+15"},
-        {1E14, " 100000000000000"},
-        {999999999999999.0, " 999999999999999"},
-        {999999999999999.4, " 999999999999999"},
         {999999999999999.9, " 1E+15"},
+        {1234567890123456.0, " 1.23456789012346E+15"},
         {0.0001, " .0001"},
-        {0.00012, " .00012"},
         {9.999999999999E-05, " 9.999999999999E-05"},
         {0.0000999999999999999999, " .0001"},
         {0.1 + 0.2, " .3"},
-        {1.0 / 3.0, " .333333333333333"},
-        {2.0 / 3.0, " .666666666666667"},
         {-2.0 / 3.0, "-.666666666666667"},
-        {100.0, " 100"},
-        {1.5, " 1.5"},
-        {-2.0, "-2"},
-        {12345.678, " 12345.678"},
-        {0.1, " .1"},
-        {1E100, " 1E+100"},
-        {1.5E-300, " 1.5E-300"},
         {DBL_MAX, " 1.79769313486232E+308"},
-        {-DBL_MAX, "-1.79769313486232E+308"},
-        {DBL_MIN, " 2.2250738585072E-308"},
         {DBL_TRUE_MIN, " 4.94065645841247E-324"},
-        {0.0, " 0"},
         {-0.0, " 0"},
+        {NAN, "NaN"},
+        {INFINITY, " Inf"},
+        {-INFINITY, "-Inf"},
         // Exact halves at the 16th digit go to the even neighbour.
         {123456789012345.5, " 123456789012346"},
         {123456789012344.5, " 123456789012344"},
         {1000000000000005.0, " 1E+15"},
-        {1000000000000015.0, " 1.00000000000002E+15"},
-        {10000000000000050.0, " 1E+16"},
         {10000000000000150.0, " 1.00000000000002E+16"},
-        {1.0 + std::ldexp(1.0, -15), " 1.00003051757812"},
-        {1.0 + 3 * std::ldexp(1.0, -15), " 1.00009155273438"},
-        {NAN, "NaN"},
-        {INFINITY, " Inf"},
-        {-INFINITY, "-Inf"},
-    };
+        {1.0 + std::ldexp(1.0, -15), " 1.00003051757812"}};
     for (const auto& [value, expected] : cases) {
-        EXPECT_EQ(str(value), expected) << std::hexfloat << value;
-        EXPECT_EQ(reference_str(value), expected) << "reference disagrees for " << expected;
-    }
-    EXPECT_EQ(text(0.5), ".5");
-    EXPECT_EQ(text(0.0), "0");
-    EXPECT_EQ(text(-2.0), "-2");
-    EXPECT_EQ(text(1E-20), "1E-20");
-    EXPECT_EQ(text(INFINITY), "Inf");
-}
-
-TEST(StandardText, PowersOfTenAndTwoWithNeighboursAcrossTheRange) {
-    for (int i = -330; i <= 310; ++i) {
-        const double p = std::pow(10.0, i);
-        for (double v : {p, std::nextafter(p, 0.0), std::nextafter(p, INFINITY), -p})
-            expect_reference(v);
-    }
-    for (int i = -1074; i <= 1023; ++i) {
-        const double p = std::ldexp(1.0, i);
-        for (double v : {p, std::nextafter(p, 0.0), std::nextafter(p, INFINITY), 3 * p, 5 * p})
-            expect_reference(v);
+        SCOPED_TRACE(expected);
+        EXPECT_EQ(str(value), expected);
+        EXPECT_EQ(text(value), expected.substr(expected[0] == ' ' ? 1 : 0));
+        EXPECT_EQ(reference_str(value), expected) << "the reference disagrees";
     }
 }
 
@@ -185,7 +150,12 @@ TEST(StandardText, MatchesCorrectlyRoundedReferenceOnRandomValues) {
     }
 }
 
-TEST(StandardText, RoundingBoundaryBelowEachPowerOfTenAcrossTheRange) {
+TEST(StandardText, PowersOfTwoAndTheDecadeBoundariesAcrossTheRange) {
+    for (int i = -1074; i <= 1023; ++i) {
+        const double p = std::ldexp(1.0, i);
+        for (double v : {p, std::nextafter(p, 0.0), std::nextafter(p, INFINITY), 3 * p, 5 * p})
+            expect_reference(v);
+    }
     // 999999999999999.5 * 10^j is where a number's 15-digit text moves to the next decade: just
     // below it the text has fifteen 9s, at or above it the text is a power of ten. Both sides,
     // and the powers of ten themselves, a few units in the last place either way.
@@ -193,10 +163,9 @@ TEST(StandardText, RoundingBoundaryBelowEachPowerOfTenAcrossTheRange) {
         for (const char* form : {"999999999999999.5e%d", "1e%d"}) {
             char text[32];
             std::snprintf(text, sizeof text, form, form[0] == '1' ? j + 15 : j);
-            const double boundary = std::strtod(text, nullptr);
-            if (boundary == 0 || !std::isfinite(boundary))
+            double v = std::strtod(text, nullptr);
+            if (v == 0 || !std::isfinite(v))
                 continue;
-            double v = boundary;
             for (int step = 0; step < 3; ++step)
                 v = std::nextafter(v, 0.0);
             for (int step = 0; step < 7; ++step, v = std::nextafter(v, INFINITY))
@@ -209,6 +178,16 @@ TEST(StandardText, RoundingBoundaryBelowEachPowerOfTenAcrossTheRange) {
     EXPECT_EQ(str(std::nextafter(99999999999999.95, 0.0)), " 99999999999999.9");
 }
 
+TEST(StandardText, ExactPathDoesNotDependOnTheLocalesPoint) {
+    // 10000000000000150 is an exact half that only the exact path can decide.
+    const std::string saved = std::setlocale(LC_NUMERIC, nullptr);
+    if (std::setlocale(LC_NUMERIC, "de_DE.UTF-8") == nullptr)
+        GTEST_SKIP() << "no German locale";
+    const std::string got = str(10000000000000150.0);
+    std::setlocale(LC_NUMERIC, saved.c_str());
+    EXPECT_EQ(got, " 1.00000000000002E+16");
+}
+
 TEST(FormatLines, SameTextsAsFormatToBetweenAnyEndsWithinTheBuffer) {
     std::mt19937_64 rng(4242);
     const std::vector<double> specials = {0.0,          -0.0,         NAN,  INFINITY,          -INFINITY,
@@ -219,17 +198,11 @@ TEST(FormatLines, SameTextsAsFormatToBetweenAnyEndsWithinTheBuffer) {
         // Up to a few batches, with every kind of number anywhere in them.
         std::vector<double> values(rng() % 300);
         for (double& v : values) {
-            switch (rng() % 4) {
-                case 0:
-                    v = specials[rng() % specials.size()];
-                    break;
-                case 1:
-                    v = std::bit_cast<double>(rng());
-                    break;
-                default:
-                    v = (static_cast<double>(rng() % 2000001) - 1E6) /
-                        std::pow(10.0, static_cast<int>(rng() % 12));
-            }
+            const auto kind = rng() % 4;
+            v = kind == 0   ? specials[rng() % specials.size()]
+                : kind == 1 ? std::bit_cast<double>(rng())
+                            : (static_cast<double>(rng() % 2000001) - 1E6) /
+                                  std::pow(10.0, static_cast<int>(rng() % 12));
         }
         const std::string& before = ends[rng() % ends.size()];
         const std::string& after = ends[rng() % ends.size()];
@@ -243,85 +216,47 @@ TEST(FormatLines, SameTextsAsFormatToBetweenAnyEndsWithinTheBuffer) {
         const size_t length =
             numtext::format_lines(buffer.data(), values.data(), values.size(), before, after);
         ASSERT_EQ(std::string(buffer.data(), length), want) << "run " << run;
-        for (size_t i = room; i < buffer.size(); ++i)
-            ASSERT_EQ(buffer[i], '#') << "wrote past the buffer in run " << run;
+        ASSERT_EQ(std::string(buffer.begin() + room, buffer.end()), std::string(16, '#')) << "run " << run;
     }
 }
 
-TEST(StandardText, ExactPathDoesNotDependOnTheLocalesPoint) {
-    // 10000000000000050 is an exact half that only the exact path can decide.
-    const std::string saved = std::setlocale(LC_NUMERIC, nullptr);
-    if (std::setlocale(LC_NUMERIC, "de_DE.UTF-8") == nullptr)
-        GTEST_SKIP() << "no German locale";
-    const std::string got = str(10000000000000150.0);
-    std::setlocale(LC_NUMERIC, saved.c_str());
-    EXPECT_EQ(got, " 1.00000000000002E+16");
-}
-
-TEST(Val, ReadsTheNumberAtTheStartOfTheText) {
-    EXPECT_EQ(val(".5"), 0.5);
-    EXPECT_EQ(val("-.25"), -0.25);
-    EXPECT_EQ(val("1E-05"), 1E-05);
-    EXPECT_EQ(val("1e-05"), 1E-05);
-    EXPECT_EQ(val("1.5D+20"), 1.5E+20);
-    EXPECT_EQ(val("2d3"), 2000.0);
-    EXPECT_EQ(val("  \t 42"), 42.0);
-    EXPECT_EQ(val("+7"), 7.0);
-    EXPECT_EQ(val("12abc"), 12.0);
-    EXPECT_EQ(val("1.2.3"), 1.2);
-    EXPECT_EQ(val("5."), 5.0);
-    EXPECT_EQ(val("1E"), 1.0);
-    EXPECT_EQ(val("1E+"), 1.0);
-    EXPECT_EQ(val("3e-x"), 3.0);
-    EXPECT_EQ(val("1,5"), 1.0);
-    EXPECT_EQ(val(" 123456789012345"), 123456789012345.0);
-    EXPECT_EQ(val("abc"), 0.0);
-    EXPECT_EQ(val(""), 0.0);
-    EXPECT_EQ(val("   "), 0.0);
-    EXPECT_EQ(val("-"), 0.0);
-    EXPECT_EQ(val("."), 0.0);
-    EXPECT_EQ(val(".e5"), 0.0);
-    EXPECT_EQ(val("inf"), 0.0);
-    EXPECT_EQ(val("nan"), 0.0);
-    EXPECT_EQ(val("&H10"), 0.0);
-    EXPECT_EQ(val("0x10"), 0.0);
-    EXPECT_TRUE(std::signbit(val("-0")));
-    EXPECT_EQ(val("4.9e-324"), DBL_TRUE_MIN);
-}
-
-TEST(Val, HostileTextsSaturateAndNeverReadPastTheView) {
+TEST(Val, ReadsTheNumberAtTheStartOfTheTextAndSaturates) {
+    const std::vector<std::pair<std::string, double>> cases = {{".5", 0.5},
+                                                               {"-.25", -0.25},
+                                                               {"1E-05", 1E-05},
+                                                               {"1.5D+20", 1.5E+20},
+                                                               {"2d3", 2000.0},
+                                                               {"  \t 42", 42.0},
+                                                               {"+7", 7.0},
+                                                               {"12abc", 12.0},
+                                                               {"1.2.3", 1.2},
+                                                               {"5.", 5.0},
+                                                               {"3e-x", 3.0},
+                                                               {" 123456789012345", 123456789012345.0},
+                                                               {"4.9e-324", DBL_TRUE_MIN},
+                                                               {"0.0000001e315", 1e308},
+                                                               {"-1e999", -DBL_MAX},
+                                                               {std::string(100000, ' ') + "2.5", 2.5},
+                                                               {"12\0x"s, 12.0},  // a NUL ends the number
+                                                               {"7\xc3\xa9", 7.0}};
+    for (const auto& [text, expected] : cases)
+        EXPECT_EQ(val(text), expected) << '"' << text.substr(0, 40) << '"';
+    // Cut short: the number before the first character that cannot go on.
+    for (const std::string& one : {"1E"s, "1E+"s, "1,5"s, "1.e"s, "1" + std::string(400, '0') + "e-400",
+                                   "0." + std::string(1000000, '0') + "1e1000001"})
+        EXPECT_EQ(val(one), 1.0) << one.substr(0, 40);
+    // No number at the start, or one below the smallest subnormal.
+    for (const std::string& zero :
+         {""s, "-"s, "."s, ".e5"s, "abc"s, "inf"s, "nan"s, "&H10"s, "0x10"s, "\xff\xfe"s, "\0x34"s, "1e-999"s,
+          "-1e-99999999999999999999"s, "123456e-330"s, "-0.0000001e-318"s, "0e99999999"s})
+        EXPECT_EQ(val(zero), 0.0) << zero;
     // Beyond the double range: the largest finite magnitude, so later sums stay finite.
-    EXPECT_EQ(val("1e999"), DBL_MAX);
-    EXPECT_EQ(val("-1e999"), -DBL_MAX);
-    EXPECT_EQ(val("1e99999999999999999999999999"), DBL_MAX);
-    EXPECT_EQ(val("0.0000001e316"), DBL_MAX);
-    EXPECT_EQ(val("0.0000001e315"), 1e308);
-    EXPECT_EQ(val("-0.0000001e-318"), 0.0);
-    EXPECT_EQ(val("1e-999"), 0.0);
-    EXPECT_EQ(val("-1e-99999999999999999999"), 0.0);
-    EXPECT_EQ(val("123456e-330"), 0.0);
-    EXPECT_EQ(val("0e99999999"), 0.0);
-    EXPECT_EQ(val("1e308"), 1e308);
-
-    // Long texts: a million digits, and a tiny mantissa lifted by a huge exponent.
-    EXPECT_EQ(val(std::string(1000000, '9')), DBL_MAX);
-    EXPECT_EQ(val("0." + std::string(1000000, '0') + "1e1000001"), 1.0);
-    EXPECT_EQ(val("1" + std::string(400, '0') + "e-400"), 1.0);
-    EXPECT_EQ(val(std::string(100000, ' ') + "2.5"), 2.5);
-
-    // Embedded NUL and non-ASCII bytes end the number; the view's end is respected.
-    EXPECT_EQ(val(std::string_view("12\0"
-                                   "34",
-                                   5)),
-              12.0);
-    EXPECT_EQ(val(std::string_view("\0"
-                                   "34",
-                                   3)),
-              0.0);
-    EXPECT_EQ(val("7\xc3\xa9"), 7.0);
-    EXPECT_EQ(val("\xff\xfe"), 0.0);
-    const char digits[] = "123456";
-    EXPECT_EQ(val(std::string_view(digits, 3)), 123.0);
+    for (const std::string& huge :
+         {"1e999"s, "1e99999999999999999999999999"s, "0.0000001e316"s, std::string(1000000, '9')})
+        EXPECT_EQ(val(huge), DBL_MAX) << huge.substr(0, 40);
+    EXPECT_TRUE(std::signbit(val("-0")));
+    // The view's end is respected.
+    EXPECT_EQ(val(std::string_view("123456", 3)), 123.0);
     EXPECT_EQ(val(std::string_view("1e5", 2)), 1.0);
 }
 
@@ -350,61 +285,57 @@ TEST(RoundTrip, TextReadsBackToTheSameValueToFifteenDigits) {
 }
 
 TEST(ToNumber, WholeTextMustBeANumber) {
-    EXPECT_EQ(to_number("1.5"), 1.5);
-    EXPECT_EQ(to_number("  -.25 \t"), -0.25);
-    EXPECT_EQ(to_number("+3"), 3.0);
-    EXPECT_EQ(to_number("5."), 5.0);
-    EXPECT_EQ(to_number("1E-05"), 1E-05);
-    EXPECT_EQ(to_number("2D2"), 200.0);
-    EXPECT_EQ(to_number("1e308"), 1e308);
-    EXPECT_EQ(to_number("-1e308"), -1e308);
-    EXPECT_EQ(to_number("1e-999"), 0.0);  // below the smallest double: zero
-    EXPECT_EQ(to_number("40000"), 40000.0);
-
+    const std::vector<std::pair<std::string, double>> good = {
+        {"  -.25 \t", -0.25},
+        {"+3", 3.0},
+        {"5.", 5.0},
+        {"2D2", 200.0},
+        {"-1e308", -1e308},
+        {"40000", 40000.0},
+        {"1e-999", 0.0},  // below the smallest double: zero
+        {std::string(300, '1'), std::strtod(std::string(300, '1').c_str(), nullptr)}};
+    for (const auto& [text, expected] : good)
+        EXPECT_EQ(to_number(text), expected) << '"' << text << '"';
     for (const char* bad :
-         {"",    "   ",   "1,5",    "12abc", "abc", "1E",  "1E+",  ".",    "-",     "+",       "1 2",
-          "--1", "1e999", "-1e999", "nan",   "inf", "NaN", "&H10", "0x10", "1.2.3", "\xc3\xa9"})
+         {"",    "   ", "1,5",   "12abc",  "abc", "1E",  "1E+",  ".",    "-",     "+",
+          "1 2", "--1", "1e999", "-1e999", "nan", "inf", "&H10", "0x10", "1.2.3", "\xc3\xa9"})
         EXPECT_EQ(to_number(bad), std::nullopt) << '"' << bad << '"';
-    EXPECT_EQ(to_number(std::string_view("1\0", 2)), std::nullopt);
+    EXPECT_EQ(to_number("1\0"s), std::nullopt);
     EXPECT_EQ(to_number(std::string(200000, '1')), std::nullopt);
-    EXPECT_EQ(to_number(std::string(300, '1')), std::strtod(std::string(300, '1').c_str(), nullptr));
 }
 
 TEST(ToInt, RoundsHalvesToEvenAndReportsValuesThatDoNotFit) {
-    EXPECT_EQ(to_int16(2.5), 2);
-    EXPECT_EQ(to_int16(3.5), 4);
-    EXPECT_EQ(to_int16(-2.5), -2);
-    EXPECT_EQ(to_int16(-3.5), -4);
-    EXPECT_EQ(to_int16(0.5), 0);
-    EXPECT_EQ(to_int16(-0.5), 0);
-    EXPECT_EQ(to_int16(1.4999999999999998), 1);
-    EXPECT_EQ(to_int16(2.5000000000000004), 3);
-    EXPECT_EQ(to_int16(-7.6), -8);
-    EXPECT_EQ(to_int16(32767.0), 32767);
-    EXPECT_EQ(to_int16(32767.4), 32767);
-    EXPECT_EQ(to_int16(32766.5), 32766);
-    EXPECT_EQ(to_int16(32767.5), std::nullopt);
-    EXPECT_EQ(to_int16(-32768.5), -32768);
-    EXPECT_EQ(to_int16(-32769.5), std::nullopt);
-    EXPECT_EQ(to_int16(40000.0), std::nullopt);
-    EXPECT_EQ(to_int16(-40000.0), std::nullopt);
-    EXPECT_EQ(to_int16(NAN), std::nullopt);
-    EXPECT_EQ(to_int16(INFINITY), std::nullopt);
-    EXPECT_EQ(to_int16(-INFINITY), std::nullopt);
-    EXPECT_EQ(to_int16(DBL_MAX), std::nullopt);
-    EXPECT_EQ(to_int16(DBL_TRUE_MIN), 0);
-
-    EXPECT_EQ(to_int32(2147483647.0), 2147483647);
-    EXPECT_EQ(to_int32(2147483646.5), 2147483646);
-    EXPECT_EQ(to_int32(2147483647.5), std::nullopt);
-    EXPECT_EQ(to_int32(-2147483648.5), -2147483647 - 1);
-    EXPECT_EQ(to_int32(-2147483649.5), std::nullopt);
-    EXPECT_EQ(to_int32(40000.0), 40000);
-    EXPECT_EQ(to_int32(1e10), std::nullopt);
-    EXPECT_EQ(to_int32(4503599627370497.0), std::nullopt);
-    EXPECT_EQ(to_int32(NAN), std::nullopt);
-    EXPECT_EQ(to_int32(12345678.5), 12345678);
-    EXPECT_EQ(to_int32(12345679.5), 12345680);
+    // Whole numbers both widths give alike.
+    const std::vector<std::pair<double, int16_t>> both = {{2.5, 2},
+                                                          {3.5, 4},
+                                                          {-2.5, -2},
+                                                          {-3.5, -4},
+                                                          {0.5, 0},
+                                                          {-0.5, 0},
+                                                          {-7.6, -8},
+                                                          {DBL_TRUE_MIN, 0},
+                                                          {1.4999999999999998, 1},
+                                                          {2.5000000000000004, 3},
+                                                          {32767.4, 32767},
+                                                          {32766.5, 32766},
+                                                          {-32768.5, -32768}};
+    for (const auto& [value, expected] : both) {
+        EXPECT_EQ(to_int16(value), expected) << value;
+        EXPECT_EQ(to_int32(value), expected) << value;
+    }
+    const std::vector<std::pair<double, int32_t>> only32 = {
+        {32767.5, 32768},           {-32769.5, -32770},         {40000.0, 40000},
+        {-40000.0, -40000},         {12345678.5, 12345678},     {12345679.5, 12345680},
+        {2147483646.5, 2147483646}, {2147483647.0, 2147483647}, {-2147483648.5, -2147483647 - 1}};
+    for (const auto& [value, expected] : only32) {
+        EXPECT_EQ(to_int16(value), std::nullopt) << value;
+        EXPECT_EQ(to_int32(value), expected) << value;
+    }
+    for (double neither : std::initializer_list<double>{2147483647.5, -2147483649.5, 1e10, 4503599627370497.0,
+                                                        DBL_MAX, NAN, INFINITY, -INFINITY}) {
+        EXPECT_EQ(to_int16(neither), std::nullopt) << neither;
+        EXPECT_EQ(to_int32(neither), std::nullopt) << neither;
+    }
 }
 
 }  // namespace

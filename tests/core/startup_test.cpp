@@ -2,6 +2,7 @@
 #include <gtest/gtest.h>
 
 #include <QFontMetrics>
+#include <functional>
 
 #include "core/GreetFrm.h"
 #include "core/global.h"
@@ -15,21 +16,15 @@
 namespace {
 
 using Names = std::vector<std::string>;
+using Ids = std::vector<int32_t>;
 
-Names probe_calls() {
-    return {"ost7720_initA",       "ost7720_initB3",      "ost7720_initC",
-            "ost7720_getNumChans", "ost7720_getHWConfig", "ost7720_close"};
-}
-
-Names session_calls() {
-    return {"ost7720_init",
-            "ost7720_getNumChans",
-            "ost7720_revision_query",
-            "ost7720_deleteAllChanGroups",
-            "ost7720_createChannelGroup",
-            "ost7720_createChannelGroup",
-            "ost7720_createChannelGroup",
-            "ost7720_createChannelGroup"};
+// from..to, then the closing 0 every id list carries.
+Ids ids(int32_t from, int32_t to, Ids tail = {0}) {
+    Ids out;
+    for (int32_t i = from; i <= to; ++i)
+        out.push_back(i);
+    out.insert(out.end(), tail.begin(), tail.end());
+    return out;
 }
 
 class StartupTest : public PanelTest {};
@@ -38,43 +33,32 @@ TEST_F(StartupTest, DefaultSystemCallSequenceChannelListsAndFirstTrace) {
     MainFrm& main = forms::get<MainFrm>();
     main.Form_Load();
 
+    const Names probe = {"ost7720_initA",       "ost7720_initB3",      "ost7720_initC",
+                         "ost7720_getNumChans", "ost7720_getHWConfig", "ost7720_close"};
     Names expected = {"ost7720_find"};
-    for (int module = 0; module < 2; ++module) {
-        Names p = probe_calls();
-        expected.insert(expected.end(), p.begin(), p.end());
-    }
-    Names s = session_calls();
-    expected.insert(expected.end(), s.begin(), s.end());
+    for (int module = 0; module < 2; ++module)
+        expected.insert(expected.end(), probe.begin(), probe.end());
+    expected.insert(expected.end(), {"ost7720_init", "ost7720_getNumChans", "ost7720_revision_query",
+                                     "ost7720_deleteAllChanGroups"});
+    expected.insert(expected.end(), 4, "ost7720_createChannelGroup");
     EXPECT_EQ(sim::call_names(), expected);
 
     const auto& log = sim::call_log();
-    EXPECT_EQ(log[1].args.at(0), "\"VXI0::8::INSTR\"");  // found in address order
+    EXPECT_EQ(log[1].args.at(0), "\"VXI0::8::INSTR\"");  // probed in address order
     EXPECT_EQ(log[7].args.at(0), "\"VXI0::16::INSTR\"");
     EXPECT_EQ(log[5].args.at(0), "0");                       // memory query before any session exists
     EXPECT_EQ(log[13].args.at(0), "\"VXI0::16,8::INSTR\"");  // last found first
 
     using namespace global;
-    EXPECT_EQ(interface_name, "VXI0");
-    EXPECT_EQ(module_count, 2);
-    EXPECT_EQ(module_address[0], 8);
-    EXPECT_EQ(module_address[1], 16);
-    EXPECT_EQ(module_memory[0], " 8 MByte");
-    EXPECT_EQ(module_memory[1], " 32 MByte");
+    EXPECT_EQ(module_address, (Ids{8, 16, 0}));
+    EXPECT_EQ(module_memory, (Names{" 8 MByte", " 32 MByte", ""}));
     EXPECT_EQ(module_tachs[0], 2);
-    EXPECT_EQ(module_use[1], flag_true);
     EXPECT_NE(session, 0);
-    EXPECT_EQ(num_inputs, 16);
-    EXPECT_EQ(num_sources, 2);
-    EXPECT_EQ(num_tachs, 2);
-    ASSERT_EQ(input_ids.size(), 17u);
-    EXPECT_EQ(input_ids[0], 1);
-    EXPECT_EQ(input_ids[15], 16);
-    EXPECT_EQ(all_ids, (std::vector<int32_t>{1,  2,  3,  4,  5,  6,    7,    8,    9,    10, 11,
-                                             12, 13, 14, 15, 16, 4097, 4098, 8193, 8194, 0}));
-    EXPECT_NE(group_inputs, 0);
+    EXPECT_EQ(input_ids, ids(1, 16));
+    EXPECT_EQ(all_ids, ids(1, 16, {4097, 4098, 8193, 8194, 0}));  // inputs, sources, tachometers
     EXPECT_NE(group_all, group_inputs);
     EXPECT_FALSE(driver_revision.empty());
-    EXPECT_EQ(driver_revision.back() == ' ', false);
+    EXPECT_NE(driver_revision.back(), ' ');
     EXPECT_EQ(trace_channel[0], 1);
     EXPECT_EQ(trace_channel[1], 0);
     EXPECT_TRUE(messages.empty());
@@ -90,7 +74,10 @@ TEST_F(StartupTest, SplashStandsInTheMainWindowsPlaceDuringDiscovery) {
         GreetFrm& splash = forms::get<GreetFrm>();
         splash_seen =
             splash.isVisible() && !main.isVisible() && splash.frameGeometry() == main.frameGeometry();
-        EXPECT_EQ(splash.Text1->text().toStdString(), "Initializing K7720A VXI Modules");
+        const QLineEdit* box = splash.Text1;
+        EXPECT_EQ(box->text().toStdString(), "Initializing K7720A VXI Modules");
+        EXPECT_GE(box->width(), QFontMetrics(box->font()).horizontalAdvance(box->text()));  // whole text
+        EXPECT_NEAR(box->x() + box->width() / 2.0, splash.width() / 2.0, 5.0);
         return dialogs::Answer::yes;
     });
     main.Form_Load();
@@ -99,37 +86,36 @@ TEST_F(StartupTest, SplashStandsInTheMainWindowsPlaceDuringDiscovery) {
     EXPECT_EQ(main.frameGeometry(), forms::get<GreetFrm>().frameGeometry());
     EXPECT_FALSE(forms::get<GreetFrm>().isVisible());
     // Yes went on: the first module's counts stay 0, the second was probed normally.
-    EXPECT_EQ(global::module_inputs[0], 0);
-    EXPECT_EQ(global::module_inputs[1], 8);
+    EXPECT_EQ(global::module_inputs, (Ids{0, 8, 0}));
 }
 
 TEST_F(StartupTest, FailedMemoryQueryReadsUnknownForThatModuleOnly) {
     sim::fail("ost7720_getHWConfig", -1074003951, 1);
     forms::get<MainFrm>().Form_Load();
-    EXPECT_EQ(global::module_memory[0], "unknown");
-    EXPECT_EQ(global::module_memory[1], " 32 MByte");
+    EXPECT_EQ(global::module_memory, (Names{"unknown", " 32 MByte", ""}));
     EXPECT_TRUE(messages.empty());
 }
 
-TEST_F(StartupTest, TwoModulesOfDifferentSizesNumberInputsInResourceListOrder) {
-    use_system({{8, 8, 1, 2, 8}, {16, 16, 0, 0, 32}});
-    forms::get<MainFrm>().Form_Load();
-    using namespace global;
-    EXPECT_EQ(num_inputs, 24);
-    EXPECT_EQ(input_ids[23], 24);
-    EXPECT_EQ(all_ids.size(), 24u + 1 + 2 + 1);
-    EXPECT_EQ(all_ids[24], 4097);
-    EXPECT_EQ(all_ids[25], 8193);
-}
-
-TEST_F(StartupTest, OneModuleGivesTwoElementTables) {
-    use_system({{5, 4, 0, 0, 8}});
-    forms::get<MainFrm>().Form_Load();
-    EXPECT_EQ(global::module_count, 1);
-    EXPECT_EQ(global::module_address.size(), 2u);
-    EXPECT_EQ(getRscsString(), "VXI0::5::INSTR");
-    EXPECT_EQ(global::num_sources, 0);
-    EXPECT_EQ(global::source_ids.size(), 1u);
+TEST_F(StartupTest, OtherSystemsGiveTheirResourceListAndIdLists) {
+    struct Case {
+        std::vector<sim::ModuleSpec> system;
+        std::string resources;
+        Ids all_ids;
+    };
+    const std::vector<Case> cases = {
+        {{{8, 8, 1, 2, 8}, {16, 16, 0, 0, 32}}, "VXI0::16,8::INSTR", ids(1, 24, {4097, 8193, 8194, 0})},
+        {{{5, 4, 0, 0, 8}}, "VXI0::5::INSTR", ids(1, 4)},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.resources);
+        use_system(c.system);
+        forms::get<MainFrm>().Form_Load();
+        EXPECT_EQ(global::module_address.size(), c.system.size() + 1);
+        EXPECT_EQ(getRscsString(), c.resources);
+        EXPECT_EQ(global::all_ids, c.all_ids);
+        EXPECT_EQ(global::source_ids.size(), static_cast<size_t>(global::num_sources) + 1);
+        forms::destroy_all();
+    }
 }
 
 TEST_F(StartupTest, ResourceListFollowsModuleUse) {
@@ -149,20 +135,13 @@ TEST_F(StartupTest, ResourceListFollowsModuleUse) {
 TEST_F(StartupTest, NoModuleInUseOpensNoSessionButStillAsksTheDriver) {
     forms::get<MainFrm>().Form_Load();
     const int32_t old_session = global::session;
-    for (auto& use : global::module_use)
-        use = global::flag_false;
+    global::module_use.assign(global::module_use.size(), global::flag_false);
     sim::clear_call_log();
     open_session();
     EXPECT_EQ(global::session, 0);
-    EXPECT_EQ(global::num_inputs, 0);
-    EXPECT_EQ(global::input_ids.size(), 1u);
-    Names expected = {"ost7720_close",
-                      "ost7720_revision_query",
-                      "ost7720_deleteAllChanGroups",
-                      "ost7720_createChannelGroup",
-                      "ost7720_createChannelGroup",
-                      "ost7720_createChannelGroup",
-                      "ost7720_createChannelGroup"};
+    EXPECT_EQ(global::input_ids, Ids{0});
+    Names expected = {"ost7720_close", "ost7720_revision_query", "ost7720_deleteAllChanGroups"};
+    expected.insert(expected.end(), 4, "ost7720_createChannelGroup");
     // Whatever the driver answered with handle 0 was reported, each under its own name, and
     // the sequence went on.
     Names steps;
@@ -171,6 +150,7 @@ TEST_F(StartupTest, NoModuleInUseOpensNoSessionButStillAsksTheDriver) {
         if (call.name == "ost7720_error_message" || call.name == "ost7720_errorDetails")
             continue;
         steps.push_back(call.name);
+        EXPECT_EQ(call.args.at(0), steps.size() == 1 ? std::to_string(old_session) : "0") << call.line();
         if (call.status == 0)
             continue;
         ASSERT_LT(failures, messages.size());
@@ -179,75 +159,42 @@ TEST_F(StartupTest, NoModuleInUseOpensNoSessionButStillAsksTheDriver) {
     }
     EXPECT_EQ(steps, expected);
     EXPECT_EQ(failures, messages.size());
-    EXPECT_EQ(sim::call_log()[0].args.at(0), std::to_string(old_session));
-    for (size_t i = 1; i < sim::call_log().size(); ++i)
-        EXPECT_EQ(sim::call_log()[i].args.at(0), "0");
 }
 
 // The fatal messages end the process, so they run in a death test's child: the responder
 // prints whether the text was exactly the expected one, and the exit status must be 0.
-void load_expecting_message(const std::string& expected) {
-    dialogs::set_responder([expected](dialogs::Kind kind, const std::string& text) {
-        fprintf(stderr, "%s",
-                text == expected && kind == dialogs::Kind::notice ? "EXACT-MESSAGE" : text.c_str());
-        return dialogs::Answer::ok;
-    });
-    forms::get<MainFrm>().Form_Load();
-    fprintf(stderr, "PROGRAM-WENT-ON");
-}
-
-const char* const rerun_advice =
-    "\r\n\r\nRecheck your configuration and run the resource manager.\r\n"
-    "Run this soft front panel again after correcting the problem.\r\n";
-
-TEST_F(StartupTest, NoModulesOrFailingFindEndsTheProgramAfterItsMessage) {
+TEST_F(StartupTest, NoModulesFailingFindOrFailingInitShowsItsMessageAndEnds) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
-    const std::string text =
-        std::string("No Ostrana K7720A modules can be found in this system.") + rerun_advice;
-    EXPECT_EXIT(
-        {
-            sim::reset({});
-            load_expecting_message(text);
-        },
-        testing::ExitedWithCode(0), "^EXACT-MESSAGE$");
-    EXPECT_EXIT(
-        {
-            sim::fail("ost7720_find", -1074003951);
-            load_expecting_message(text);
-        },
-        testing::ExitedWithCode(0), "^EXACT-MESSAGE$");
-}
-
-TEST_F(StartupTest, FailingInitStageShowsTheDriversTextAndEnds) {
-    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    const std::string advice =
+        "\r\n\r\nRecheck your configuration and run the resource manager.\r\n"
+        "Run this soft front panel again after correcting the problem.\r\n";
+    const std::string no_modules = "No Ostrana K7720A modules can be found in this system." + advice;
     std::string driver_text(250, ' ');
     ost7720_error_message(0, -1074003951, driver_text.data());
-    driver_text.resize(driver_text.find('\0'));
-    const std::string text = "ost7720_init returned error: " + driver_text + rerun_advice;
-    for (const char* stage : {"ost7720_initA", "ost7720_initB3", "ost7720_initC"}) {
+    const std::string init_error =
+        "ost7720_init returned error: " + driver_text.substr(0, driver_text.find('\0')) + advice;
+    const std::vector<std::tuple<const char*, std::function<void()>, std::string>> cases = {
+        {"no module", [] { sim::reset({}); }, no_modules},
+        {"find fails", [] { sim::fail("ost7720_find", -1074003951); }, no_modules},
+        {"initA fails", [] { sim::fail("ost7720_initA", -1074003951, 1); }, init_error},
+        {"initB3 fails", [] { sim::fail("ost7720_initB3", -1074003951, 1); }, init_error},
+        {"initC fails", [] { sim::fail("ost7720_initC", -1074003951, 1); }, init_error},
+    };
+    for (const auto& [name, arrange, expected] : cases) {
         EXPECT_EXIT(
             {
-                sim::fail(stage, -1074003951, 1);
-                load_expecting_message(text);
+                arrange();
+                dialogs::set_responder([&](dialogs::Kind kind, const std::string& text) {
+                    const bool exact = text == expected && kind == dialogs::Kind::notice;
+                    fprintf(stderr, "%s", exact ? "EXACT-MESSAGE" : text.c_str());
+                    return dialogs::Answer::ok;
+                });
+                forms::get<MainFrm>().Form_Load();
+                fprintf(stderr, "PROGRAM-WENT-ON");
             },
             testing::ExitedWithCode(0), "^EXACT-MESSAGE$")
-            << stage;
+            << name;
     }
-}
-
-}  // namespace
-
-namespace {
-
-TEST_F(StartupTest, SplashTextFitsItsBoxAndIsCentred) {
-    GreetFrm& splash = forms::get<GreetFrm>();
-    splash.resize(853, 683);
-    splash.show();
-    splash.run_resize();
-    const QLineEdit* box = splash.Text1;
-    EXPECT_GE(box->width(), QFontMetrics(box->font()).horizontalAdvance(box->text()));
-    EXPECT_NEAR(box->x() + box->width() / 2.0, splash.width() / 2.0, 5.0);
-    EXPECT_NEAR(box->y(), splash.height() / 2.0, 1.0);
 }
 
 }  // namespace

@@ -2,49 +2,28 @@
 // driver functions each of its steps calls, then once more for every such call site with that
 // function failing throughout the step. Every failure must be reported under the function's own
 // name and code, Yes must let the session finish, and Go must still give a block afterwards.
-// Answering No must end the program at once (death tests, one per function), and a failure in
-// discovery's find or init calls must show its fatal message and end the program.
-#include <gtest/gtest.h>
-
-#include <unistd.h>
-
-#include <QTest>
+// Answering No must end the program at once (a death test per function). Discovery's find and
+// init calls end the program with their own messages: tests/core/startup_test.cpp checks those.
 #include <cstdio>
-#include <filesystem>
-#include <fstream>
 #include <functional>
 #include <map>
 #include <set>
-#include <string>
-#include <vector>
 
-#include "core/global.h"
-#include "core/windows.h"
-#include "display/MainFrm.h"
 #include "pages/DispFrm.h"
 #include "pages/InputFrm.h"
 #include "pages/MeasFrm.h"
 #include "pages/SrcFrm.h"
 #include "pages/VxiFrm.h"
-#include "panel_fixture.h"
+#include "run_fixture.h"
 
 namespace {
-
-namespace fs = std::filesystem;
 
 constexpr int32_t failure = -1074003951;
 // Longer than one 1024-point block at the top span (0.02 s), so every tick may find one.
 constexpr double tick_seconds = 0.05;
-// Ticks a step waits for a block before it moves on (a failing poll never gives one).
-constexpr int max_ticks = 6;
 
-const std::string span_message = "The selected span is too high";
-const std::string arb_refused = "The arbritray source is refusing to take data";
-
-// Discovery's own handling: these end the program with a fatal message.
 const std::set<std::string> fatal_at_start = {"ost7720_find", "ost7720_initA", "ost7720_initB3",
                                               "ost7720_initC"};
-
 // Without these the session has no channels or no groups until it is opened again.
 const std::set<std::string> session_builders = {"ost7720_init", "ost7720_getNumChans",
                                                 "ost7720_createChannelGroup"};
@@ -54,24 +33,16 @@ struct Step {
     std::function<void()> run;
 };
 
-// What one step of the clean session called: each function and how often.
+// What one step of a session called: each function and how often.
 using StepCalls = std::map<std::string, size_t>;
 
-class FaultSweepTest : public PanelTest {
+class FaultSweepTest : public RunTest {
   protected:
     void SetUp() override {
-        PanelTest::SetUp();
-        dir_ = fs::temp_directory_path() / ("k7720-sweep-" + std::to_string(::getpid()));
+        RunTest::SetUp();
         GTEST_FLAG_SET(death_test_style, "threadsafe");
     }
-    void TearDown() override {
-        fs::remove_all(dir_);
-        PanelTest::TearDown();
-    }
-
-    MainFrm& main() { return forms::get<MainFrm>(); }
-    static void click(QAbstractButton* b) { QTest::mouseClick(b, Qt::LeftButton); }
-    std::string file(int t) const { return (dir_ / ("trace" + std::to_string(t + 1) + ".txt")).string(); }
+    std::string trace_file(int t) const { return file("trace" + std::to_string(t + 1) + ".txt"); }
 
     // A fresh program run: no window, the simulator powered on, the clock stopped.
     void power_on() {
@@ -79,102 +50,67 @@ class FaultSweepTest : public PanelTest {
         use_system(sim::default_system());
         sim::use_virtual_clock();
         messages.clear();
-        fs::remove_all(dir_);
-        fs::create_directories(dir_);
+        empty_folder();
     }
-
-    void tick() {
-        sim::advance_clock(tick_seconds);
-        main().MainTimer_Timer();
+    // Ticks until the run ends or a few ticks gave no block (a failing poll never gives one).
+    static void tick_until_idle() {
+        for (int n = 0; n < 6 && global::running == global::flag_true; ++n)
+            tick(tick_seconds);
     }
-    // Ticks until the run ends or the step gives up waiting.
-    void tick_until_idle() {
-        for (int n = 0; n < max_ticks && global::running == global::flag_true; ++n)
-            tick();
+    static void go_until_idle() {
+        click(main().GoBtn);
+        tick_until_idle();
+    }
+    static void meas_page(const std::function<void(MeasFrm&)>& choose) {
+        click(main().MeasBtn);
+        choose(forms::get<MeasFrm>());
+        click(forms::get<MeasFrm>().doneBtn);
     }
 
     // The session, step by step, through the main window's buttons and the pages' controls.
     std::vector<Step> session() {
         return {
-            {"start-up", [this] { main().Form_Load(); }},
+            {"start-up", [] { main().Form_Load(); }},
             {"Display page: four traces with files, OK",
              [this] {
                  click(main().DispBtn);
                  DispFrm& page = forms::get<DispFrm>();
                  for (int t = 0; t < 4; ++t) {
                      page.TrcChanCmbo[t]->setEditText(QString::number(t + 1));
-                     page.Text1[t]->setText(QString::fromStdString(file(t)));
+                     page.Text1[t]->setText(QString::fromStdString(trace_file(t)));
                  }
                  click(page.doneBtn);
              }},
-            {"Go in Single Block",
-             [this] {
-                 click(main().GoBtn);
-                 tick_until_idle();
-             }},
+            {"Go in Single Block", go_until_idle},
             {"Meas page: Repeat, Frequency, OK",
-             [this] {
-                 click(main().MeasBtn);
-                 MeasFrm& page = forms::get<MeasFrm>();
-                 click(page.RepeatBtn);
-                 click(page.FreqBtn);
-                 click(page.doneBtn);
-             }},
+             [] { meas_page([](MeasFrm& p) { click(p.RepeatBtn), click(p.FreqBtn); }); }},
             {"Go in Repeat, three blocks, Stop",
-             [this] {
+             [] {
                  click(main().GoBtn);
                  for (int n = 0; n < 3; ++n)
-                     tick();
+                     tick(tick_seconds);
                  if (global::running == global::flag_true)
                      click(main().GoBtn);
              }},
             {"Meas page: Manual, Single Block, Time, OK",
-             [this] {
-                 click(main().MeasBtn);
-                 MeasFrm& page = forms::get<MeasFrm>();
-                 click(page.ManualBtn);
-                 click(page.SingleBtn);
-                 click(page.TimeBtn);
-                 click(page.doneBtn);
-             }},
+             [] { meas_page([](MeasFrm& p) { click(p.ManualBtn), click(p.SingleBtn), click(p.TimeBtn); }); }},
             {"Go in Manual with the Trigger button",
-             [this] {
+             [] {
                  click(main().GoBtn);
-                 tick();  // the first tick makes Trigger usable
+                 tick(tick_seconds);  // the first tick makes Trigger usable
                  click(main().TriggerBtn);
                  tick_until_idle();
              }},
             {"Meas page: Auto, Multi Mainframe, OK",
-             [this] {
-                 click(main().MeasBtn);
-                 MeasFrm& page = forms::get<MeasFrm>();
-                 click(page.AutoBtn);
-                 page.mmcheck->setChecked(true);
-                 click(page.doneBtn);
-             }},
-            {"Go across mainframes",
-             [this] {
-                 click(main().GoBtn);
-                 tick_until_idle();
-             }},
+             [] { meas_page([](MeasFrm& p) { click(p.AutoBtn), p.mmcheck->setChecked(true); }); }},
+            {"Go across mainframes", go_until_idle},
             {"Meas page: one mainframe, OK",
-             [this] {
-                 click(main().MeasBtn);
-                 MeasFrm& page = forms::get<MeasFrm>();
-                 page.mmcheck->setChecked(false);
-                 click(page.doneBtn);
-             }},
-            {"Input page OK",
-             [this] {
-                 click(main().InpBtn);
-                 click(forms::get<InputFrm>().doneBtn);
-             }},
+             [] { meas_page([](MeasFrm& p) { p.mmcheck->setChecked(false); }); }},
+            {"Input page OK", [] { click(main().InpBtn), click(forms::get<InputFrm>().doneBtn); }},
             {"Source page: Default Values, Apply",
-             [this] {
-                 click(main().SrcBtn);
-                 SrcFrm& page = forms::get<SrcFrm>();
-                 click(page.PresetBtn);
-                 click(page.ApplyBtn);
+             [] {
+                 click(main().SrcBtn), click(forms::get<SrcFrm>().PresetBtn),
+                     click(forms::get<SrcFrm>().ApplyBtn);
              }},
             {"Source page: active Arbitrary, Apply, OK",
              [] {
@@ -185,10 +121,7 @@ class FaultSweepTest : public PanelTest {
                  click(page.doneBtn);
              }},
             {"VXI page OK: the session opened again",
-             [this] {
-                 click(main().VxiBtn);
-                 click(forms::get<VxiFrm>().doneBtn);
-             }},
+             [] { click(main().VxiBtn), click(forms::get<VxiFrm>().doneBtn); }},
         };
     }
 
@@ -205,31 +138,25 @@ class FaultSweepTest : public PanelTest {
             sim::clear_failures();
             if (calls.empty())
                 discovery_end_ = sim::call_log().size();
-            StepCalls seen;
-            const auto& log = sim::call_log();
-            for (size_t i = first; i < log.size(); ++i)
-                ++seen[log[i].name];
-            calls.push_back(std::move(seen));
+            StepCalls& seen = calls.emplace_back();
+            for (size_t i = first; i < sim::call_log().size(); ++i)
+                ++seen[sim::call_log()[i].name];
         }
         return calls;
     }
 
     // With every failure gone, Go still gives a block in all four traces and their files.
-    void expect_go_works(const std::string& context) {
-        SCOPED_TRACE(context);
+    void expect_go_works() {
         ASSERT_TRUE(main().isVisible());
-        sim::clear_failures();
         const size_t before = messages.size();
         global::trace_has_data.fill(global::flag_false);
-        click(main().GoBtn);
-        tick_until_idle();
+        go_until_idle();
         EXPECT_EQ(main().GoBtn->text(), "Go");
         EXPECT_EQ(global::running, global::flag_false);
         for (int t = 0; t < 4; ++t) {
             EXPECT_EQ(global::trace_has_data[t], global::flag_true) << "trace " << t + 1;
-            std::ifstream in(file(t), std::ios::binary);
-            const std::string all((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
-            EXPECT_EQ(std::count(all.begin(), all.end(), '\n'), global::num_points + 1) << "trace " << t + 1;
+            EXPECT_EQ(lines_in(trace_file(t)), static_cast<size_t>(global::num_points) + 1)
+                << "trace " << t + 1;
         }
         EXPECT_EQ(messages.size(), before);
     }
@@ -237,18 +164,17 @@ class FaultSweepTest : public PanelTest {
     // "name returned code" of every question asked, in order.
     std::vector<std::string> reports() const {
         std::vector<std::string> out;
+        const std::string lead = "ost7720_32.dll: ";
         for (const Message& m : messages) {
-            if (m.kind != dialogs::Kind::question)
-                continue;
-            const std::string lead = "ost7720_32.dll: ";
             const size_t from = m.text.find(lead);
-            if (from == std::string::npos) {
-                out.push_back("unexpected question: " + m.text);
+            if (m.kind == dialogs::Kind::notice)
                 continue;
-            }
-            const size_t name_end = m.text.find(' ', from + lead.size());
-            const size_t code_end = m.text.find(' ', m.text.find("returned ", name_end) + 9);
-            out.push_back(m.text.substr(from + lead.size(), code_end - from - lead.size()));
+            if (from == std::string::npos)
+                out.push_back("unexpected question: " + m.text);
+            else
+                out.push_back(m.text.substr(
+                    from + lead.size(),
+                    m.text.find(' ', m.text.find(" returned ", from) + 10) - from - lead.size()));
         }
         return out;
     }
@@ -260,51 +186,31 @@ class FaultSweepTest : public PanelTest {
         const auto& log = sim::call_log();
         for (size_t i = 0; i < log.size(); ++i) {
             const sim::Call& c = log[i];
-            if (c.status == 0)
-                continue;
-            if (c.name == "ost7720_error_message" || c.name == "ost7720_errorDetails")
-                continue;  // the report's own calls; their status is not looked at
-            if (c.name == "ost7720_blockAvailable" && c.status > 0)
-                continue;  // a positive poll status is no error
-            if (c.name == "ost7720_setSpan")
-                continue;  // the span message instead
-            if (i < discovery_end_ && (c.name == "ost7720_close" || c.name == "ost7720_getHWConfig"))
-                continue;  // discovery's probe does not look at these
-            out.push_back(c.name + " returned " + std::to_string(c.status));
+            const bool handled =
+                c.name == "ost7720_error_message" ||
+                c.name == "ost7720_errorDetails"                         // the report's own calls
+                || (c.name == "ost7720_blockAvailable" && c.status > 0)  // not an error
+                || c.name == "ost7720_setSpan"                           // the span message instead
+                || (i < discovery_end_ && (c.name == "ost7720_close" || c.name == "ost7720_getHWConfig"));
+            if (c.status != 0 && !handled)
+                out.push_back(c.name + " returned " + std::to_string(c.status));
         }
         return out;
     }
 
-    size_t questions() const {
-        size_t n = 0;
-        for (const Message& m : messages)
-            n += m.kind == dialogs::Kind::question;
-        return n;
-    }
     size_t notices_starting(const std::string& text) const {
-        size_t n = 0;
-        for (const Message& m : messages)
-            n += m.kind == dialogs::Kind::notice && m.text.rfind(text, 0) == 0;
-        return n;
+        return static_cast<size_t>(std::count_if(messages.begin(), messages.end(), [&](const Message& m) {
+            return m.kind == dialogs::Kind::notice && m.text.starts_with(text);
+        }));
     }
 
-    // The functions the clean session calls, in name order.
-    std::set<std::string> called_functions() {
-        std::set<std::string> names;
-        for (const StepCalls& step : run_session())
-            for (const auto& [name, count] : step)
-                names.insert(name);
-        return names;
-    }
-
-    fs::path dir_;
     size_t discovery_end_ = 0;  // log entries made by start-up
 };
 
 TEST_F(FaultSweepTest, EveryCallSiteFailingIsReportedUnderItsNameYesFinishesAndGoStillWorks) {
     const std::vector<StepCalls> clean = run_session();
-    EXPECT_EQ(questions(), 0u);
-    expect_go_works("clean session");
+    EXPECT_EQ(reports(), std::vector<std::string>{});
+    expect_go_works();
     const std::vector<Step> steps = session();
     ASSERT_EQ(clean.size(), steps.size());
 
@@ -314,7 +220,7 @@ TEST_F(FaultSweepTest, EveryCallSiteFailingIsReportedUnderItsNameYesFinishesAndG
         for (const auto& [function, clean_count] : clean[s]) {
             functions.insert(function);
             if (s == 0 && fatal_at_start.count(function))
-                continue;  // ends the program: the death test below
+                continue;  // ends the program
             ++sites;
             SCOPED_TRACE(steps[s].name + ": " + function);
             const std::vector<StepCalls> run = run_session(steps[s].name, function);
@@ -324,10 +230,10 @@ TEST_F(FaultSweepTest, EveryCallSiteFailingIsReportedUnderItsNameYesFinishesAndG
             // driver's code; later calls the driver refuses because of it are reported too.
             EXPECT_EQ(reports(), expected_reports());
             if (function == "ost7720_setSpan") {
-                EXPECT_EQ(notices_starting(span_message), failed);
+                EXPECT_EQ(notices_starting("The selected span is too high"), failed);
             }
             if (function == "ost7720_checkSrcArbRdy") {
-                EXPECT_EQ(notices_starting(arb_refused), failed);
+                EXPECT_EQ(notices_starting("The arbritray source is refusing to take data"), failed);
             }
             if (s == 0 && function == "ost7720_getHWConfig") {
                 EXPECT_EQ(global::module_memory[0], "unknown");
@@ -336,15 +242,13 @@ TEST_F(FaultSweepTest, EveryCallSiteFailingIsReportedUnderItsNameYesFinishesAndG
             // failure that left no usable session when the VXI page opened it last needs that
             // page's OK once more, as a user would do.
             if (s + 1 == steps.size() && session_builders.count(function)) {
-                sim::clear_failures();
-                click(main().GoBtn);  // refused call by call, but it must not hang or crash
-                tick_until_idle();
+                go_until_idle();  // refused call by call, but it must not hang or crash
                 if (global::running == global::flag_true)
                     click(main().GoBtn);
                 click(main().VxiBtn);
                 click(forms::get<VxiFrm>().doneBtn);
             }
-            expect_go_works(steps[s].name + ": " + function);
+            expect_go_works();
         }
     }
     // Every function the session calls was made to fail somewhere.
@@ -354,21 +258,22 @@ TEST_F(FaultSweepTest, EveryCallSiteFailingIsReportedUnderItsNameYesFinishesAndG
         functions.size(), sites, fatal_at_start.size());
     EXPECT_GE(functions.size(), 40u);
     EXPECT_GE(sites, functions.size());
-    for (const std::string& f : fatal_at_start)
+    for (const std::string& f : fatal_at_start) {
         EXPECT_TRUE(functions.count(f)) << f;
+    }
 }
 
 // The first report's No ends the program: nothing after it runs, neither another message nor
 // the rest of the session. A function whose failure is never reported (the memory query) or
-// shows its own notice (the span) lets the session run on to Exit.
+// shows its own notice (the span) lets the session run on to Exit, which ends the program.
 TEST_F(FaultSweepTest, AnsweringNoToAnyReportEndsTheProgramAtOnce) {
-    const std::set<std::string> functions = called_functions();
-    size_t checked = 0;
+    std::set<std::string> functions;
+    for (const StepCalls& step : run_session())
+        for (const auto& [name, count] : step)
+            if (!fatal_at_start.count(name))
+                functions.insert(name);
     for (const std::string& function : functions) {
-        if (fatal_at_start.count(function))
-            continue;
         const bool never_asked = function == "ost7720_getHWConfig" || function == "ost7720_setSpan";
-        const std::string expected = never_asked ? "^EXIT$" : "^NO " + function + "$";
         EXPECT_EXIT(
             {
                 dialogs::set_responder([](dialogs::Kind kind, const std::string& text) {
@@ -386,60 +291,10 @@ TEST_F(FaultSweepTest, AnsweringNoToAnyReportEndsTheProgramAtOnce) {
                 click(main().ExitBtn);
                 std::fprintf(stderr, " RETURNED");
             },
-            testing::ExitedWithCode(0), expected)
-            << function;
-        ++checked;
-    }
-    std::printf("[ fault sweep ] No ends the program: %zu driver functions\n", checked);
-}
-
-// Exit after a clean session ends the program after closing the session; a failing close is
-// reported and either answer still ends it.
-TEST_F(FaultSweepTest, ExitAfterTheSessionEndsTheProgram) {
-    for (const char* answer : {"", "yes", "no"}) {
-        const bool fail_close = *answer != 0;
-        const dialogs::Answer a = std::string(answer) == "no" ? dialogs::Answer::no : dialogs::Answer::yes;
-        EXPECT_EXIT(
-            {
-                run_session();
-                dialogs::set_responder([a](dialogs::Kind, const std::string& text) {
-                    std::fprintf(stderr, "%s",
-                                 text.find("ost7720_close returned") != std::string::npos ? "CLOSE" : "?");
-                    return a;
-                });
-                if (fail_close)
-                    sim::fail("ost7720_close", failure);
-                sim::clear_call_log();
-                click(main().ExitBtn);
-                std::fprintf(stderr, " RETURNED");
-            },
-            testing::ExitedWithCode(0), fail_close ? "^CLOSE$" : "^$")
-            << answer;
-    }
-}
-
-// Discovery's find and init calls: a fatal message, then the end of the program, whatever else.
-TEST_F(FaultSweepTest, FailingFindOrInitAtStartUpShowsTheFatalMessageAndEnds) {
-    for (const std::string& function : fatal_at_start) {
-        const std::string expected = function == "ost7720_find"
-                                         ? "^No Ostrana K7720A modules can be found in this system\\.$"
-                                         : "^ost7720_init returned error: .+$";
-        EXPECT_EXIT(
-            {
-                dialogs::set_responder([](dialogs::Kind kind, const std::string& text) {
-                    std::fprintf(
-                        stderr, "%s",
-                        kind == dialogs::Kind::notice ? text.substr(0, text.find('\r')).c_str() : "QUESTION");
-                    return dialogs::Answer::yes;
-                });
-                power_on();
-                sim::fail(function, failure);
-                main().Form_Load();
-                std::fprintf(stderr, " RETURNED");
-            },
-            testing::ExitedWithCode(0), expected)
+            testing::ExitedWithCode(0), never_asked ? "^EXIT$" : "^NO " + function + "$")
             << function;
     }
+    std::printf("[ fault sweep ] No ends the program: %zu driver functions\n", functions.size());
 }
 
 }  // namespace
