@@ -3,7 +3,10 @@
 // The first 8 bytes are taken as a double: its text must match a reference laid out by plain
 // string handling from the C library's exactly rounded "%.14e", and must read back as the value
 // rounded to 15 significant digits. The rounding to 16- and 32-bit integers is checked against
-// nearbyint. The whole input, as text, must read without a crash and give a finite number.
+// nearbyint. Every whole 8 bytes of the input, as a batch of doubles, must give format_lines
+// the reference line for each, within the buffer it asks for. The whole input, as text, must
+// read without a crash and give a finite number.
+#include <algorithm>
 #include <cfenv>
 #include <cfloat>
 #include <cmath>
@@ -13,6 +16,7 @@
 #include <cstring>
 #include <string>
 #include <string_view>
+#include <vector>
 
 #include "core/number_text.h"
 
@@ -117,6 +121,33 @@ void check_double(double x) {
     check_integers(x);
 }
 
+// The batch form: the line of each value, framed as the output files frame it or otherwise,
+// in a buffer of exactly the size it asks for (the address sanitizer catches a write beyond).
+void check_lines(const uint8_t* data, size_t size) {
+    // Two whole batches of 64 and a part of a third are enough; more only slows the run.
+    const size_t count = std::min<size_t>(size / sizeof(double), 150);
+    std::vector<double> values(count);
+    if (count > 0)
+        std::memcpy(values.data(), data, count * sizeof(double));
+    static const std::string_view frames[][2] = {{"\"", "\"\r\n"}, {"", ""}, {"", ","}, {"<<", ">>\n"}};
+    const auto& frame = frames[size % 4];
+    const std::string_view before = frame[0];
+    const std::string_view after = frame[1];
+    std::vector<char> buffer(count * (before.size() + 22 + after.size()) + 32);
+    const size_t n = numtext::format_lines(buffer.data(), values.data(), count, before, after);
+    std::string want;
+    for (double x : values)
+        want += std::string(before) + reference_str(x) + std::string(after);
+    const std::string got(buffer.data(), std::min(n, buffer.size()));
+    if (n != want.size() || got != want) {
+        size_t at = 0;
+        while (at < got.size() && at < want.size() && got[at] == want[at])
+            ++at;
+        fail("format_lines", count > 0 ? values[0] : 0.0, got.substr(at > 20 ? at - 20 : 0, 60),
+             want.substr(at > 20 ? at - 20 : 0, 60));
+    }
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
@@ -125,6 +156,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         std::memcpy(&x, data, sizeof x);
         check_double(x);
     }
+    check_lines(data, size);
     const std::string_view text(reinterpret_cast<const char*>(data), size);
     const double v = numtext::val(text);
     if (!std::isfinite(v))
