@@ -183,21 +183,14 @@ TEST_F(MainLayoutTest, ScaleBoxesBelongToTheSlotShownBesideThem) {
     EXPECT_EQ(global::trace_low[2], -10.0);
 }
 
-class GridPage : public Form {
-  public:
-    GridPage() : Form(QStringLiteral("Grid")) {
-        ok = new QPushButton(QStringLiteral("OK"), this);
-        cancel = new QPushButton(QStringLiteral("Cancel"), this);
-        label = new QLabel(QStringLiteral("Range"), this);
-        field = new QPushButton(QStringLiteral("field"), this);
-        option = new QRadioButton(QStringLiteral("Single Block"), this);
-        resize(640, 480);  // 9600 x 7200 twips: RU = 400, CU = 800
-    }
-    QPushButton* ok;
-    QPushButton* cancel;
-    QLabel* label;
-    QPushButton* field;
-    QRadioButton* option;
+// A page of 640 x 480 pixels, 9600 x 7200 twips: RU = 400, CU = 800.
+struct GridPage : Form {
+    GridPage() : Form(QStringLiteral("Grid")) { resize(640, 480); }
+    QPushButton* ok = new QPushButton(QStringLiteral("OK"), this);
+    QPushButton* cancel = new QPushButton(QStringLiteral("Cancel"), this);
+    QLabel* label = new QLabel(QStringLiteral("Range"), this);
+    QPushButton* field = new QPushButton(QStringLiteral("field"), this);
+    QRadioButton* option = new QRadioButton(QStringLiteral("Single Block"), this);
 };
 
 class PageLayoutTest : public PanelTest {};
@@ -211,34 +204,29 @@ TEST_F(PageLayoutTest, OkAndCancelSitAtTheLowerLeftOneEighthWide) {
     EXPECT_EQ(page.cancel->geometry(), QRect(160, 405, 80, 32));
 }
 
-TEST_F(PageLayoutTest, GridRowsAndColumnsByIndexAndKind) {
+TEST_F(PageLayoutTest, GridPlacesByIndexAndKindAndSizesLabelsAndOptionButtons) {
     GridPage& page = forms::get<GridPage>();
-
-    // Index 9, kind 2: row 1 of the second column, Top 3 RU = 1200, Left 7 CU = 5600.
-    place_in_grid(page, page.field, 9, 2);
-    EXPECT_EQ(page.field->pos(), QPoint(373, 80));
-    // Index 3, kind 0: Top 400 + 3 * 800 = 2800, Left 400 + 800.
-    place_in_grid(page, page.field, 3, 0);
-    EXPECT_EQ(page.field->pos(), QPoint(80, 187));
-    // Index 8, any other kind: first row of the second column, Left 400 + 4000.
-    place_in_grid(page, page.field, 8, 5);
-    EXPECT_EQ(page.field->pos(), QPoint(293, 27));
-    // A negative index keeps its sign through mod: Top 400 - 800.
-    place_in_grid(page, page.field, -1, 3);
-    EXPECT_EQ(page.field->pos(), QPoint(27, -27));
-
-    // Kind 1, a label: sized to its caption plus 5 twips, 300 twips high, at the column's left.
-    place_in_grid(page, page.label, 7, 1);
-    const int text = QFontMetrics(page.font()).horizontalAdvance(QStringLiteral("Range"));
-    EXPECT_EQ(page.label->geometry(), QRect(27, 400, text, 20));
-}
-
-TEST_F(PageLayoutTest, OptionButtonIsItsCaptionPlus300TwipsWideAndOneLineHigh) {
-    GridPage& page = forms::get<GridPage>();
-    size_option_button(page, page.option);
+    struct Case {
+        int16_t index, kind;
+        QPoint pos;
+    } const cases[] = {
+        {9, 2, {373, 80}},   // row 1 of the second column: Top 3 RU = 1200, Left 7 CU = 5600
+        {3, 0, {80, 187}},   // Top 400 + 3 * 800 = 2800, Left 400 + 800
+        {8, 5, {293, 27}},   // any other kind: first row of the second column, Left 400 + 4000
+        {-1, 3, {27, -27}},  // a negative index keeps its sign through mod: Top 400 - 800
+    };
+    for (const Case& c : cases) {
+        place_in_grid(page, page.field, c.index, c.kind);
+        EXPECT_EQ(page.field->pos(), c.pos) << c.index << " kind " << c.kind;
+    }
+    // Kind 1, a label: its caption's width plus 5 twips, 300 twips high, at the column's left.
     const QFontMetrics fm(page.font());
-    EXPECT_EQ(page.option->width(), fm.horizontalAdvance(QStringLiteral("Single Block")) + 20);
-    EXPECT_EQ(page.option->height(), fm.height());
+    place_in_grid(page, page.label, 7, 1);
+    EXPECT_EQ(page.label->geometry(), QRect(27, 400, fm.horizontalAdvance(QStringLiteral("Range")), 20));
+    // An option button: its caption's width plus 300 twips, one text line high.
+    size_option_button(page, page.option);
+    EXPECT_EQ(page.option->size(),
+              QSize(fm.horizontalAdvance(QStringLiteral("Single Block")) + 20, fm.height()));
 }
 
 }  // namespace

@@ -90,8 +90,6 @@ class OutputFilesTest : public PanelTest {
         std::string pattern = (fs::temp_directory_path() / "k7720_output_XXXXXX").string();
         ASSERT_NE(mkdtemp(pattern.data()), nullptr);
         dir = pattern;
-        for (int t = 0; t <= 3; ++t)
-            global::trace_data(t).assign(1, 0.0);
     }
     void TearDown() override {
         std::error_code ec;
@@ -125,25 +123,17 @@ class OutputFilesTest : public PanelTest {
     std::string read_only;  // a file made read-only, made writable again at the end
 };
 
-TEST_F(OutputFilesTest, BlockIsWrittenAsQuotedStandardTextWithCrLf) {
-    global::num_points = 4;
-    set_trace(0, {1.5, -2.0, 0.0, 1E-20}, path("t1.txt"));
-    set_trace(2, {0.25, -0.5, 123456789012345.0, 1E15}, path("t3.txt"));
-    write(global::flag_false);
-    EXPECT_EQ(contents(path("t1.txt")), example_block);
-    EXPECT_EQ(contents(path("t3.txt")),
-              "\" .25\"\r\n\"-.5\"\r\n\" 123456789012345\"\r\n\" 1E+15\"\r\n\" 0\"\r\n");
-    EXPECT_TRUE(messages.empty());
-}
-
-TEST_F(OutputFilesTest, SingleBlockRewritesRepeatAppendsAndTwoTracesMayShareAFile) {
+TEST_F(OutputFilesTest, BlocksAreQuotedStandardTextsWithCrLfRewrittenOrAppended) {
     global::num_points = 4;
     const std::string file = path("trace.txt");
     std::ofstream(file) << "old contents of an earlier run\n";
     set_trace(0, {1.5, -2.0, 0.0, 1E-20}, file);
+    set_trace(2, {0.25, -0.5, 123456789012345.0, 1E15}, path("t3.txt"));
     write(global::flag_false);
     write(global::flag_false);
     EXPECT_EQ(contents(file), example_block);
+    EXPECT_EQ(contents(path("t3.txt")),
+              "\" .25\"\r\n\"-.5\"\r\n\" 123456789012345\"\r\n\" 1E+15\"\r\n\" 0\"\r\n");
     write(global::flag_true);
     write(global::flag_true);
     EXPECT_EQ(contents(file), example_block + example_block + example_block);
