@@ -33,6 +33,7 @@ TEST_F(StartupTest, DefaultSystemCallSequenceChannelListsAndFirstTrace) {
     MainFrm& main = forms::get<MainFrm>();
     main.Form_Load();
 
+    // Each module probed (three init stages, channel count, memory, close), then the session.
     const Names probe = {"ost7720_initA",       "ost7720_initB3",      "ost7720_initC",
                          "ost7720_getNumChans", "ost7720_getHWConfig", "ost7720_close"};
     Names expected = {"ost7720_find"};
@@ -94,28 +95,6 @@ TEST_F(StartupTest, FailedMemoryQueryReadsUnknownForThatModuleOnly) {
     forms::get<MainFrm>().Form_Load();
     EXPECT_EQ(global::module_memory, (Names{"unknown", " 32 MByte", ""}));
     EXPECT_TRUE(messages.empty());
-}
-
-TEST_F(StartupTest, OtherSystemsGiveTheirResourceListAndIdLists) {
-    struct Case {
-        std::vector<sim::ModuleSpec> system;
-        std::string resources;
-        Ids all_ids;
-    };
-    const std::vector<Case> cases = {
-        {{{8, 8, 1, 2, 8}, {16, 16, 0, 0, 32}}, "VXI0::16,8::INSTR", ids(1, 24, {4097, 8193, 8194, 0})},
-        {{{5, 4, 0, 0, 8}}, "VXI0::5::INSTR", ids(1, 4)},
-    };
-    for (const Case& c : cases) {
-        SCOPED_TRACE(c.resources);
-        use_system(c.system);
-        forms::get<MainFrm>().Form_Load();
-        EXPECT_EQ(global::module_address.size(), c.system.size() + 1);
-        EXPECT_EQ(getRscsString(), c.resources);
-        EXPECT_EQ(global::all_ids, c.all_ids);
-        EXPECT_EQ(global::source_ids.size(), static_cast<size_t>(global::num_sources) + 1);
-        forms::destroy_all();
-    }
 }
 
 TEST_F(StartupTest, ResourceListFollowsModuleUse) {
