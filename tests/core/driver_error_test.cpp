@@ -17,7 +17,7 @@ using Names = std::vector<std::string>;
 TEST(CleanDriverText, KeepsTextBeforeNulMakesControlsBlanksAndTrims) {
     const std::vector<std::pair<std::string, std::string>> cases = {
         {std::string("  Invalid session\0      ", 24), "Invalid session"},
-        {std::string("a\tb\nc\rd\0", 8), "a b c d"},
+        {std::string("a\tb\nc\rd\r\n\0", 10), "a b c d"},   // controls at the end trimmed too
         {std::string("caf\xc3\xa9\x7f!\0", 8), "caf   !"},  // non-ASCII and DEL
         {"no terminator", ""},
         {std::string("\0after", 6), ""},
