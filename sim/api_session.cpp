@@ -30,7 +30,7 @@ void write_text(char* buffer, size_t size, const std::string& text) {
 
 // The hardware-configuration record of a module; index 25 is the memory size.
 void fill_hw_record(const Module& m, int32_t* r) {
-    const ModuleSpec& s = m.spec;
+    const ModuleSpec& s = m.config;
     const int32_t values[hw_record_longs] = {
         s.address,                     // 0 logical address
         0x0F77,                        // 1 manufacturer id
@@ -99,7 +99,7 @@ int32_t open_session(const char* fn, const char* resource, int16_t id_query, int
     std::vector<int> modules;
     for (int32_t a : addresses) {
         auto it = std::find_if(sys.modules.begin(), sys.modules.end(),
-                               [a](const Module& m) { return m.spec.address == a; });
+                               [a](const Module& m) { return m.config.address == a; });
         if (it == sys.modules.end())
             return refuse(err_resource_not_found, "no module at address " + std::to_string(a));
         modules.push_back(static_cast<int>(it - sys.modules.begin()));
@@ -156,7 +156,7 @@ int32_t OST7720_CALL ost7720_find(int32_t reserved, int32_t* addresses, int32_t 
         return api.status();
     int32_t n = std::min(static_cast<int32_t>(sys.modules.size()), max_modules);
     for (int32_t i = 0; i < n; ++i)
-        addresses[i] = sys.modules[static_cast<size_t>(i)].spec.address;
+        addresses[i] = sys.modules[static_cast<size_t>(i)].config.address;
     *found = n;
     write_text(interface_name, interface_buffer, sim::interface_name);
     api.out_array(addresses, n);

@@ -90,7 +90,7 @@ int32_t OST7720_CALL ost7720_setBlocksize(int32_t session, int32_t channel, int3
         if (!coerce_blocksize(blocksize, m.largest_blocksize, size))
             return api.refuse(err_invalid_value, "block size " + std::to_string(blocksize) + " not in 1.." +
                                                      std::to_string(m.largest_blocksize) + " (module " +
-                                                     std::to_string(m.spec.address) + ")");
+                                                     std::to_string(m.config.address) + ")");
     }
     coerce_blocksize(blocksize, max_blocksize, size);
     for (Channel* c : chans)

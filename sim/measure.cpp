@@ -44,7 +44,7 @@ signals::SourceParams source_params(const Channel& src, double sample_rate) {
 }
 
 uint32_t noise_seed(const Channel& ch, const System& sys, int32_t index) {
-    return static_cast<uint32_t>(sys.modules[static_cast<size_t>(ch.module)].spec.address) * 256u +
+    return static_cast<uint32_t>(sys.modules[static_cast<size_t>(ch.module)].config.address) * 256u +
            static_cast<uint32_t>(index) + 1u;
 }
 

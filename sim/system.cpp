@@ -15,7 +15,7 @@ System sys_;
 bool powered_ = false;
 std::chrono::steady_clock::time_point origin_ = std::chrono::steady_clock::now();
 
-void power_on(const std::vector<ModuleSpec>& specs, std::string config_error) {
+void power_on(const std::vector<ModuleSpec>& modules, std::string config_error) {
     sys_ = System{};
     origin_ = std::chrono::steady_clock::now();
     reset_call_log();
@@ -23,21 +23,21 @@ void power_on(const std::vector<ModuleSpec>& specs, std::string config_error) {
     sys_.config_error = std::move(config_error);
     if (sys_.config_error.empty()) {
         std::string error;
-        if (!check_modules(specs, error)) {
+        if (!check_modules(modules, error)) {
             sys_.config_error = "simulated system: " + error;
         }
     }
     if (!sys_.config_error.empty())
         return;
 
-    std::vector<ModuleSpec> sorted = specs;
+    std::vector<ModuleSpec> sorted = modules;
     std::sort(sorted.begin(), sorted.end(),
               [](const ModuleSpec& a, const ModuleSpec& b) { return a.address < b.address; });
     bool primary_taken = false;
     for (size_t m = 0; m < sorted.size(); ++m) {
         Module mod;
-        mod.spec = sorted[m];
-        mod.largest_blocksize = largest_blocksize_for(mod.spec);
+        mod.config = sorted[m];
+        mod.largest_blocksize = largest_blocksize_for(mod.config);
         auto make = [&](std::vector<Channel>& list, ChannelKind kind, int32_t count) {
             for (int32_t i = 0; i < count; ++i) {
                 bool primary = kind == ChannelKind::source && !primary_taken;
@@ -48,9 +48,9 @@ void power_on(const std::vector<ModuleSpec>& specs, std::string config_error) {
                 list.push_back(std::move(ch));
             }
         };
-        make(mod.inputs, ChannelKind::input, mod.spec.inputs);
-        make(mod.sources, ChannelKind::source, mod.spec.sources);
-        make(mod.tachs, ChannelKind::tach, mod.spec.tachs);
+        make(mod.inputs, ChannelKind::input, mod.config.inputs);
+        make(mod.sources, ChannelKind::source, mod.config.sources);
+        make(mod.tachs, ChannelKind::tach, mod.config.tachs);
         sys_.modules.push_back(std::move(mod));
     }
 }
@@ -167,10 +167,10 @@ void preset_channel(Channel& ch) {
     ch.active_since = now_seconds();
 }
 
-int32_t largest_blocksize_for(const ModuleSpec& spec) {
+int32_t largest_blocksize_for(const ModuleSpec& module) {
     // Each measuring channel keeps two blocks of 4-byte samples (one filling, one to read).
-    int64_t channels = std::max<int64_t>(1, int64_t{spec.inputs} + spec.tachs);
-    int64_t samples = int64_t{spec.megabytes} * 1048576 / (8 * channels);
+    int64_t channels = std::max<int64_t>(1, int64_t{module.inputs} + module.tachs);
+    int64_t samples = int64_t{module.megabytes} * 1048576 / (8 * channels);
     int32_t size = min_blocksize;
     while (size < max_blocksize && int64_t{size} * 2 <= samples)
         size *= 2;
@@ -179,7 +179,7 @@ int32_t largest_blocksize_for(const ModuleSpec& spec) {
 
 Module* find_module(int32_t address) {
     for (Module& m : state().modules) {
-        if (m.spec.address == address)
+        if (m.config.address == address)
             return &m;
     }
     return nullptr;

@@ -133,7 +133,7 @@ struct Channel {
 };
 
 struct Module {
-    ModuleSpec spec;
+    ModuleSpec config;
     int32_t largest_blocksize = max_blocksize;  // what the memory allows
     std::vector<Channel> inputs, sources, tachs;
     std::vector<Channel>& of(ChannelKind k) {
@@ -216,7 +216,7 @@ Channel power_on_channel(ChannelKind kind, bool primary_source);
 void preset_channel(Channel& ch);
 
 // Largest block size a module's memory holds for all of its channels.
-int32_t largest_blocksize_for(const ModuleSpec& spec);
+int32_t largest_blocksize_for(const ModuleSpec& module);
 
 Module* find_module(int32_t address);
 Channel& channel_at(const ChannelRef& ref);
