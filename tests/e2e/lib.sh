@@ -1,9 +1,8 @@
 # shellcheck shell=bash disable=SC2034  # sets variables for the scripts that source it
-# Helpers of the end-to-end runs, sourced by each script: an X server of the run's own, the panel
-# under it, clicks at places relative to a window, screenshots and the simulator's call trace.
-# A script calls e2e_init with the panel's path first; everything it starts is ended on exit.
-# Places in a window are fractions of its size (awk expressions) plus a pixel offset, the way the
-# panel's own layout computes them, so they hold for any screen size.
+# Helpers of the end-to-end runs: an X server of the run's own, the panel under it, clicks at places
+# relative to a window, screenshots and the simulator's call trace. A script calls e2e_init with the
+# panel's path first; everything it starts is ended on exit. Places in a window are fractions of its
+# size (awk expressions) plus pixels, as the panel's layout computes them, so they hold on any screen.
 set -euo pipefail
 
 E2E_SCREEN_W=${E2E_SCREEN_W:-1280}
@@ -19,28 +18,19 @@ e2e_note() { echo "-- $*"; }
 e2e_not() { ! "$@"; }
 e2e_int() { awk "BEGIN { printf \"%d\", $1 }"; }  # EXPR: its value, truncated
 
-# Skips the run when a tool is missing; scripts/bootstrap installs them.
-e2e_require() {
+e2e_require() { # TOOL...: skips the run when one is missing; scripts/bootstrap installs them
     local tool
-    for tool; do
-        command -v "$tool" >/dev/null 2>&1 ||
-            e2e_skip "$tool is not installed; the end-to-end runs need the Debian packages xvfb, xdotool and imagemagick"
-    done
+    for tool; do command -v "$tool" >/dev/null 2>&1 || e2e_skip "$tool is not installed; the end-to-end runs need the Debian packages xvfb, xdotool and imagemagick"; done
 }
 
-e2e_end() { # PID: ends a process this run started, if it still runs
-    if [ -n "$1" ] && kill "$1" 2>/dev/null; then wait "$1" 2>/dev/null || true; fi
-}
-
+# On exit: ends the panel and the X server, then removes the run's files, or keeps them after a failure.
 e2e_cleanup() {
-    local status=$? f
-    e2e_end "$PANEL_PID"
-    e2e_end "$XVFB_PID"
+    local status=$? pid f
+    for pid in "$PANEL_PID" "$XVFB_PID"; do
+        if [ -n "$pid" ] && kill "$pid" 2>/dev/null; then wait "$pid" 2>/dev/null || true; fi
+    done
     [ -n "$E2E_DIR" ] || return 0
-    if { [ "$status" -eq 0 ] || [ "$status" -eq 77 ]; } && [ "$E2E_KEEP" -eq 0 ]; then
-        rm -rf "$E2E_DIR"
-        return 0
-    fi
+    if { [ "$status" -eq 0 ] || [ "$status" -eq 77 ]; } && [ "$E2E_KEEP" -eq 0 ]; then rm -rf "$E2E_DIR" && return 0; fi
     echo "The run's files (call trace, panel log, screenshots) are kept in $E2E_DIR" >&2
     for f in panel.log calls.txt; do
         if [ -s "$E2E_DIR/$f" ]; then echo "--- $f, last lines:" && tail -n 20 "$E2E_DIR/$f"; fi >&2
@@ -91,8 +81,7 @@ e2e_panel_alive() { kill -0 "$PANEL_PID" 2>/dev/null; }
 # e2e_wait_exit: waits for the panel to end and sets PANEL_STATUS to its exit status.
 e2e_wait_exit() {
     e2e_wait "$E2E_TIMEOUT" "the panel to end" e2e_not e2e_panel_alive
-    PANEL_STATUS=0
-    wait "$PANEL_PID" || PANEL_STATUS=$?
+    PANEL_STATUS=0 && wait "$PANEL_PID" || PANEL_STATUS=$?
     PANEL_PID=""
 }
 
@@ -112,8 +101,7 @@ e2e_wait_window() {
 # the trace) and only one window with the panel's title is left, the splash having gone.
 e2e_wait_main() {
     e2e_wait "$E2E_TIMEOUT" "the start-up to open the session" e2e_started
-    e2e_wait_window "$APP_TITLE"
-    MAIN=$WIN
+    e2e_wait_window "$APP_TITLE" && MAIN=$WIN
 }
 
 e2e_started() {
@@ -123,16 +111,14 @@ e2e_started() {
 
 # e2e_wait_page TITLE: waits for a page to take the main window's place; sets PAGE.
 e2e_wait_page() {
-    e2e_wait_window "$1"
-    PAGE=$WIN
+    e2e_wait_window "$1" && PAGE=$WIN
     e2e_wait "$E2E_TIMEOUT" "the main window to hand its place to \"$1\"" e2e_windows_are 0 "$APP_TITLE"
 }
 
 # e2e_back_to_main TITLE: waits for the page to give its place back to the main window.
 e2e_back_to_main() {
     e2e_wait "$E2E_TIMEOUT" "the page \"$1\" to close" e2e_windows_are 0 "$1"
-    e2e_wait_window "$APP_TITLE"
-    MAIN=$WIN
+    e2e_wait_window "$APP_TITLE" && MAIN=$WIN
 }
 
 # e2e_wait_dialog MAIN: waits for a message box (a second window with the panel's title over the
@@ -162,20 +148,14 @@ e2e_at() {
 e2e_click() { e2e_at "$@" && xdotool mousemove "$PX" "$PY" click 1; }  # WID FX FY [DX DY]
 
 # e2e_type WID FX FY DX DY TEXT: clicks into a text box, selects what it holds and types TEXT over it.
-e2e_type() {
-    e2e_click "$1" "$2" "$3" "$4" "$5"
-    xdotool key ctrl+a
-    xdotool type --delay 5 -- "$6"
-}
+e2e_type() { e2e_click "$1" "$2" "$3" "$4" "$5" && xdotool key ctrl+a && xdotool type --delay 5 -- "$6"; }
 
 # e2e_key WID KEY...: keys to a window, with the pointer over it (no window manager: the
 # keyboard follows the pointer) and the input focus set to it.
 e2e_key() {
-    e2e_at "$1" 0.5 0.5
-    xdotool mousemove "$PX" "$PY"
+    e2e_at "$1" 0.5 0.5 && xdotool mousemove "$PX" "$PY"
     xdotool windowfocus "$1" 2>/dev/null || true
-    shift
-    xdotool key "$@"
+    shift && xdotool key "$@"
 }
 
 e2e_shot() { import -window "$1" "$2"; }  # WID FILE: the window's pixels as PNG

@@ -1,9 +1,9 @@
 // Fuzz target: the simulator's resource-string parser.
 //
-// Any text: no crash, no read past it, and a one-line printable reason on refusal. A text it
-// accepts must be exactly the canonical list it stands for ("VXI0::" addresses joined by ","
-// "::INSTR"), with 1..50 distinct addresses in 1..255. And the other way round: a canonical list
-// built from the input bytes must parse back to the same addresses.
+// Any text: no crash, no read past it, and a one-line printable reason on refusal, with no
+// address left. A text it accepts must be exactly the canonical list it stands for ("VXI0::"
+// addresses joined by "," "::INSTR"), with 1..50 distinct addresses in 1..255. And the other way
+// round: a canonical list built from the input bytes must parse back to the same addresses.
 #include <algorithm>
 #include <cstdint>
 #include <cstdio>
@@ -24,59 +24,37 @@ namespace {
 }
 
 std::string canonical(const std::vector<int32_t>& addresses) {
-    std::string s = "VXI0::";
-    for (size_t i = 0; i < addresses.size(); ++i)
-        s += (i ? "," : "") + std::to_string(addresses[i]);
+    std::string s;
+    for (int32_t a : addresses)
+        s += (s.empty() ? "VXI0::" : ",") + std::to_string(a);
     return s + "::INSTR";
-}
-
-void check_reason(std::string_view text, const std::string& error) {
-    if (error.empty())
-        fail("refused without a reason", text, "");
-    if (error.size() > 300)
-        fail("reason too long", text, error);
-    for (char c : error)
-        if (static_cast<unsigned char>(c) < 32 || static_cast<unsigned char>(c) > 126)
-            fail("reason not printable", text, error);
 }
 
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    // The parser gets a view of exactly these bytes: a copy of just this size lets the address
-    // sanitizer catch a read past its end.
-    const std::string owned(reinterpret_cast<const char*>(data), size);
-    const std::string_view text(owned.data(), owned.size());
+    // A view of exactly libFuzzer's bytes: the address sanitizer catches a read past them.
+    const std::string_view text(reinterpret_cast<const char*>(data), size);
     std::vector<int32_t> addresses{99};
     std::string error;
-    const sim::ResourceError result = sim::parse_resource(text, addresses, error);
-    if (result == sim::ResourceError::none) {
-        if (addresses.empty() || addresses.size() > 50)
-            fail("accepted a list of the wrong length", text, std::to_string(addresses.size()));
-        std::set<int32_t> seen;
-        for (int32_t a : addresses)
-            if (a < 1 || a > 255 || !seen.insert(a).second)
-                fail("accepted a bad address", text, std::to_string(a));
-        if (canonical(addresses) != text)
-            fail("accepted a text that is not its canonical list", text, canonical(addresses));
-    } else {
-        if (!addresses.empty())
-            fail("refused but left addresses", text, std::to_string(addresses.size()));
-        check_reason(text, error);
+    if (sim::parse_resource(text, addresses, error) == sim::ResourceError::none) {
+        const std::set<int32_t> distinct(addresses.begin(), addresses.end());
+        if (addresses.empty() || addresses.size() > 50 || distinct.size() != addresses.size() ||
+            *distinct.begin() < 1 || *distinct.rbegin() > 255 || canonical(addresses) != text)
+            fail("accepted a text that is not a canonical list of 1..50 distinct addresses in 1..255", text,
+                 canonical(addresses));
+    } else if (!addresses.empty() || error.empty() || error.size() > 300 ||
+               std::any_of(error.begin(), error.end(), [](unsigned char c) { return c < 32 || c > 126; })) {
+        fail("refused without a one-line printable reason, or left addresses", text, error);
     }
 
     // The bytes as a list of addresses: each byte 1..255 once, up to 50 of them.
-    std::vector<int32_t> wanted;
-    std::set<int32_t> used;
+    std::vector<int32_t> wanted, got;
     for (size_t i = 0; i < size && wanted.size() < 50; ++i)
-        if (data[i] != 0 && used.insert(data[i]).second)
+        if (data[i] != 0 && std::find(wanted.begin(), wanted.end(), data[i]) == wanted.end())
             wanted.push_back(data[i]);
-    if (!wanted.empty()) {
-        const std::string list = canonical(wanted);
-        std::vector<int32_t> got;
-        error.clear();
-        if (sim::parse_resource(list, got, error) != sim::ResourceError::none || got != wanted)
-            fail("refused or changed a canonical list", list, error);
-    }
+    if (!wanted.empty() &&
+        (sim::parse_resource(canonical(wanted), got, error) != sim::ResourceError::none || got != wanted))
+        fail("refused or changed a canonical list", canonical(wanted), error);
     return 0;
 }

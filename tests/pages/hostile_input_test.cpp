@@ -103,14 +103,8 @@ void expect_sent_to(const std::vector<sim::Call>& log, const std::set<int32_t>& 
 // a run of whole numbers), a number within the page's limits, never NaN; the span is open at
 // both ends.
 void expect_allowed_values(const std::vector<sim::Call>& log) {
-    struct Rule {
-        const char* call;
-        size_t arg;
-        double low;
-        double high;
-    };
     // clang-format off
-    static const std::vector<Rule> rules = {
+    static const std::vector<std::tuple<const char*, size_t, double, double>> rules = {
         {"ost7720_setActive", 2, 420, 421}, {"ost7720_setTriggerChannel", 2, 420, 421},
         {"ost7720_setSourceMode", 2, 170, 177}, {"ost7720_setSourceOutput", 2, 700, 704},
         {"ost7720_setSourceSum", 2, 190, 191}, {"ost7720_setSourceCola", 2, 180, 181},
@@ -123,9 +117,9 @@ void expect_allowed_values(const std::vector<sim::Call>& log) {
         {"ost7720_setDutyCycle", 2, 0, 1}, {"ost7720_setBlocksize", 2, 1, 2147483647},
         {"ost7720_setSpan", 2, std::nextafter(0.0, 1.0), std::nextafter(76801.0, 0.0)}};
     // clang-format on
-    for (const Rule& r : rules)
-        for (double v : sent(log, r.call, r.arg)) {
-            EXPECT_TRUE(v >= r.low && v <= r.high) << r.call << " argument " << r.arg << ": " << v;
+    for (const auto& [call, arg, low, high] : rules)
+        for (double v : sent(log, call, arg)) {
+            EXPECT_TRUE(v >= low && v <= high) << call << " argument " << arg << ": " << v;
         }
 }
 
@@ -155,9 +149,9 @@ class HostileInputTest : public PanelTest {
         for (const Hostile& h : hostile_texts)
             for (bool typed : {true, false})
                 if (!typed || h.text.size() <= 100) {
-                    const QString name =
-                        h.text.size() > 100 ? h.text.left(10) + "... (long)" : "\"" + h.text + "\"";
-                    SCOPED_TRACE(name.toStdString() + (typed ? " typed" : " pasted"));
+                    SCOPED_TRACE(("\"" + (h.text.size() > 100 ? h.text.left(10) + "..." : h.text) + "\"")
+                                     .toStdString() +
+                                 (typed ? " typed" : " pasted"));
                     body(h, typed);
                 }
     }
@@ -210,10 +204,9 @@ TEST_F(HostileInputTest, DisplayPageStoresChannelsThatFitAndNamesAsTypedAndRunsG
         // gives at most the one message.
         messages.clear();
         expect_a_run_works();
-        EXPECT_LE(messages.size(), 1u);
-        for (const Message& m : messages) {
-            EXPECT_EQ(m.text.rfind("Couldn't create ", 0), 0u);
-        }
+        ASSERT_LE(messages.size(), 1u);
+        EXPECT_TRUE(messages.empty() || messages[0].text.rfind("Couldn't create ", 0) == 0)
+            << messages[0].text;
     });
 }
 
@@ -244,16 +237,10 @@ TEST_F(HostileInputTest, MeasPageTakesOnlyBlockSizesAndSpansItAllowsAndRunsGoOn)
 TEST_F(HostileInputTest, InputPageSendsAllowedValuesAndRefusesChannelsBeyond16Bits) {
     InputFrm& page = forms::get<InputFrm>();
     QLineEdit* const channel_box = page.ChnNumCmbo->lineEdit();
-    const std::vector<QLineEdit*> boxes = {channel_box,
-                                           page.CoupCmbo->lineEdit(),
-                                           page.DAACmbo->lineEdit(),
-                                           page.inpmodeCmbo->lineEdit(),
-                                           page.TrigOnCmbo->lineEdit(),
-                                           page.TrigModeCmbo->lineEdit(),
-                                           page.TrigDirCmbo->lineEdit(),
-                                           page.RangeTxt,
-                                           page.TrigLvlTxt,
-                                           page.HystTxt};
+    std::vector<QLineEdit*> boxes = {page.RangeTxt, page.TrigLvlTxt, page.HystTxt};
+    for (QComboBox* c : {page.ChnNumCmbo, page.CoupCmbo, page.DAACmbo, page.inpmodeCmbo, page.TrigOnCmbo,
+                         page.TrigModeCmbo, page.TrigDirCmbo})
+        boxes.push_back(c->lineEdit());
     for_each_entry([&](const Hostile& h, bool typed) {
         for (QLineEdit* box : boxes) {
             SCOPED_TRACE("box " + std::to_string(std::find(boxes.begin(), boxes.end(), box) - boxes.begin()));
@@ -285,7 +272,7 @@ TEST_F(HostileInputTest, InputPageSendsAllowedValuesAndRefusesChannelsBeyond16Bi
             EXPECT_TRUE(main().isVisible());
             if (box == page.RangeTxt) {
                 EXPECT_EQ(sent(log, "ost7720_setRange"),
-                          std::vector<double>{std::clamp(h.number, 0.0, 20.0)});
+                          std::vector<double>(1, std::clamp(h.number, 0.0, 20.0)));
             }
             if (box == page.TrigLvlTxt) {
                 // The level typed is the one the slope fires at.
@@ -331,8 +318,7 @@ TEST_F(HostileInputTest, SourcePageSendsAllowedValuesAndNeverWritesAnotherSource
         QLineEdit* line;
         const char* notice;  // a choice box: the notice for a text it lacks (one ending in a blank names it)
         const char* call;    // its setting's call; for a number box, with the limits of the value sent
-        double low;
-        double high;
+        double low, high;
     };
     // clang-format off
     const std::vector<Box> boxes = {
