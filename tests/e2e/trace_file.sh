@@ -26,28 +26,21 @@ check_blocks() {
         function fail(why) { printf "line %d: %s: [%s]\n", NR, why, $0; bad = 1; exit }
         !sub(/\r$/, "") { fail("not ended by CR LF") }
         !/^"[ -](0|[1-9][0-9]*(\.[0-9]*[1-9])?|\.[0-9]*[1-9])(E[+-][0-9]+)?"$/ { fail("not the standard number text, quoted") }
-        {
-            digits = $0; sub(/E.*/, "", digits); gsub(/[^0-9]/, "", digits); sub(/^0+/, "", digits)
-            if (length(digits) > 15) fail("more than 15 digits")
-            v = substr($0, 3, length($0) - 3) * (substr($0, 2, 1) == "-" ? -1 : 1)
-        }
+        { digits = $0; sub(/E.*/, "", digits); gsub(/[^0-9]/, "", digits); sub(/^0+/, "", digits) }
+        length(digits) > 15 { fail("more than 15 digits") }
+        { v = substr($0, 3, length($0) - 3) * (substr($0, 2, 1) == "-" ? -1 : 1) }
         (NR - 1) % 1025 == 1024 {
             if ($0 != "\" 0\"") fail("a block does not close with element 0")
             if (crossings < 38 || crossings > 42) fail("block of " (crossings + 0) " zero crossings, not 20 periods")
             if (peak < 0.9 || peak > 1.1) fail("block peak " peak ", not the 1 V sine")
-            crossings = peak = 0
-            next
+            crossings = peak = 0; next
         }
         v > 2 || v < -2 { fail("sample beyond the 2 V range") }
-        {
-            if (v > peak || -v > peak) peak = v < 0 ? -v : v
-            if ((NR - 1) % 1025 > 0 && (v < 0) != (prev < 0)) crossings++
-            prev = v
-        }
-        END {
-            if (!bad && NR != blocks * 1025) { printf "%d lines, not %d blocks of 1025\n", NR, blocks; bad = 1 }
-            exit bad
-        }' "$1") || e2e_fail "$1: $report"
+        v > peak || -v > peak { peak = v < 0 ? -v : v }
+        (NR - 1) % 1025 > 0 && (v < 0) != (prev < 0) { crossings++ }
+        { prev = v }
+        END { if (!bad && NR != blocks * 1025) { printf "%d lines, not %d blocks of 1025\n", NR, blocks; bad = 1 }; exit bad }
+    ' "$1") || e2e_fail "$1: $report"
 }
 has_lines() { [ -f "$1" ] && [ "$(wc -l <"$1")" -eq "$2" ]; }
 

@@ -3,10 +3,9 @@
 // reaches the driver is one the page allows (a code it knows, a number within its limits, never
 // NaN), a number too big for its integer is handled as the page decided and never wraps round
 // to another channel or source, and a run still works afterwards.
-#include <unistd.h>
-
 #include <QApplication>
 #include <QClipboard>
+#include <QTemporaryDir>
 #include <QTest>
 #include <algorithm>
 #include <cfloat>
@@ -37,6 +36,7 @@ namespace fs = std::filesystem;
 struct Hostile {
     QString text;
     double number;
+    QString held() const { return text.left(32767); }  // what a box holds: a line edit keeps 32767 characters
     bool fits16() const { return std::abs(number) <= 32767; }
     bool fits32() const { return std::abs(number) <= 2147483647; }
 };
@@ -49,11 +49,6 @@ const std::vector<Hostile> hostile_texts = {
     {QString("1234567890").repeated(10000), DBL_MAX}, {QString("abcdefghijklmnopqrstuvwxyz").repeated(4000), 0},
     {QString::fromUtf8("\u03a9\u00b2\u00b5"), 0}, {QString::fromUtf8("\u65e5\u672c\u8a9e"), 0}};
 // clang-format on
-
-// What a box holds after the text went in: a line edit keeps at most 32767 characters.
-QString held(const QString& text) {
-    return text.left(32767);
-}
 
 // Empties the box as a user does (select all, Backspace), then types the text key by key (the
 // character as the key's text: keyClicks drops anything beyond Latin-1) or pastes it.
@@ -128,17 +123,13 @@ class HostileInputTest : public PanelTest {
     void SetUp() override {
         PanelTest::SetUp();
         // Hostile file names are written where the panel runs: somewhere of our own.
-        std::string pattern = (fs::temp_directory_path() / "k7720_hostile_XXXXXX").string();
-        ASSERT_NE(mkdtemp(pattern.data()), nullptr);
-        dir_ = pattern;
-        fs::current_path(dir_);
+        ASSERT_TRUE(dir_.isValid());
+        fs::current_path(dir_.path().toStdString());
         main().Form_Load();
         sim::use_virtual_clock();
     }
     void TearDown() override {
         fs::current_path(old_dir_);
-        std::error_code ec;
-        fs::remove_all(dir_, ec);
         PanelTest::TearDown();
     }
 
@@ -181,7 +172,7 @@ class HostileInputTest : public PanelTest {
     }
 
     fs::path old_dir_ = fs::current_path();
-    fs::path dir_;
+    QTemporaryDir dir_;
 };
 
 TEST_F(HostileInputTest, DisplayPageStoresChannelsThatFitAndNamesAsTypedAndRunsGoOn) {
@@ -192,13 +183,13 @@ TEST_F(HostileInputTest, DisplayPageStoresChannelsThatFitAndNamesAsTypedAndRunsG
         for (size_t i = 0; i < 4; ++i)
             for (QLineEdit* box : {page.TrcChanCmbo[i]->lineEdit(), page.Text1[i]}) {
                 enter(box, h.text, typed);
-                ASSERT_EQ(box->text(), held(h.text));
+                ASSERT_EQ(box->text(), h.held());
             }
         click(page.doneBtn);
         for (size_t i = 0; i < 4; ++i) {
             EXPECT_EQ(global::trace_channel[i], h.fits32() ? static_cast<int32_t>(h.number) : 0)
                 << "trace " << i;
-            EXPECT_EQ(global::trace_file[i], held(h.text).toStdString()) << "trace " << i;
+            EXPECT_EQ(global::trace_file[i], h.held().toStdString()) << "trace " << i;
         }
         // Hostile file names are written or refused by name; all four are the same, so one block
         // gives at most the one message.
@@ -224,7 +215,7 @@ TEST_F(HostileInputTest, MeasPageTakesOnlyBlockSizesAndSpansItAllowsAndRunsGoOn)
             ASSERT_TRUE(page.isVisible());
             QLineEdit* box = size_box ? page.BlocksizeTxt : page.SpanTxt;
             enter(box, h.text, typed);
-            ASSERT_EQ(box->text(), held(h.text));
+            ASSERT_EQ(box->text(), h.held());
             click(page.doneBtn);
             expect_a_run_works();
             EXPECT_EQ(sent(sim::call_log(), "ost7720_setBlocksize"),
@@ -254,7 +245,7 @@ TEST_F(HostileInputTest, InputPageSendsAllowedValuesAndRefusesChannelsBeyond16Bi
             const bool positive = page.TrigDirCmbo->currentText() == "Pos/Exit";
             messages.clear();
             enter(box, h.text, typed);
-            ASSERT_EQ(box->text(), held(h.text));
+            ASSERT_EQ(box->text(), h.held());
             const std::vector<sim::Call> log = press(page.doneBtn);
             if (box == channel_box && !h.fits16()) {
                 // Refused with its message; nothing sent; the page stays for a correction.
@@ -349,7 +340,7 @@ TEST_F(HostileInputTest, SourcePageSendsAllowedValuesAndNeverWritesAnotherSource
             enter(box.line, h.text, typed);
             const QString shown = box.line->text();
             if (box.line != source_box) {
-                ASSERT_EQ(shown, held(h.text));
+                ASSERT_EQ(shown, h.held());
             }
             messages.clear();
             // The keys went to the box without giving it the focus, so no focus change corrects
@@ -364,9 +355,8 @@ TEST_F(HostileInputTest, SourcePageSendsAllowedValuesAndNeverWritesAnotherSource
             if (box.line == source_box) {
                 // Typing corrects the box key by key; a paste stands as it is. Either way only a
                 // number that fits and names a source gets the page written, and only to it.
-                const bool names_source = shown == held(h.text)
-                                              ? h.fits16() && (h.number == 1 || h.number == 2)
-                                              : shown == "1" || shown == "2";
+                const bool names_source = shown == h.held() ? h.fits16() && (h.number == 1 || h.number == 2)
+                                                            : shown == "1" || shown == "2";
                 expect_sent_to(log, {source1, source2}, true);
                 if (!names_source) {
                     EXPECT_TRUE(std::none_of(pass.begin(), pass.end(), is_set));
@@ -385,7 +375,7 @@ TEST_F(HostileInputTest, SourcePageSendsAllowedValuesAndNeverWritesAnotherSource
                 // sent (the mode becomes Sine, 170).
                 std::string want = box.notice;
                 if (want.back() == ' ')
-                    want += held(h.text).toStdString() + " - ignored";
+                    want += h.held().toStdString() + " - ignored";
                 EXPECT_EQ(std::count_if(messages.begin(), messages.end(),
                                         [&](const Message& m) {
                                             return m.kind == dialogs::Kind::notice && m.text == want;
