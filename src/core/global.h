@@ -67,8 +67,7 @@ inline std::vector<float> x_values;
 
 inline int16_t all_channels_match = flag_true;
 
-// Main window layout metrics in twips. Wider than the original 16 bits so that no window
-// size can overflow them.
+// Main window layout metrics in twips, 32 bits wide so that no window size can overflow them.
 inline int32_t trace_area_left = 0;
 inline int32_t trace_area_top = 0;
 inline int32_t trace_area_width = 0;
