@@ -88,34 +88,35 @@ int32_t OST7720_CALL ost7720_armMeasure(int32_t session, int32_t channel, int32_
     return arm_step(api, *s, ArmStep::master_setup, ArmStep::armed);
 }
 
-int32_t OST7720_CALL ost7720_armMeasureMasterSetup(int32_t session, int32_t master) {
-    Api api("ost7720_armMeasureMasterSetup", session, {trace_int(session), trace_int(master)});
+namespace {
+
+// One arming step addressed to a single channel (the master or the slave).
+int32_t arm_on_channel(const char* name, int32_t session, int32_t channel, const char* role, ArmStep from,
+                       ArmStep to) {
+    Api api(name, session, {trace_int(session), trace_int(channel)});
     if (api.injected())
         return api.status();
     Session* s = api.session(session);
-    if (!s || !single_channel(api, *s, master, k_any, "master"))
+    if (!s || !single_channel(api, *s, channel, k_any, role))
         return api.status();
-    return arm_step(api, *s, ArmStep::none, ArmStep::master_setup);
+    return arm_step(api, *s, from, to);
+}
+
+}  // namespace
+
+int32_t OST7720_CALL ost7720_armMeasureMasterSetup(int32_t session, int32_t master) {
+    return arm_on_channel("ost7720_armMeasureMasterSetup", session, master, "master", ArmStep::none,
+                          ArmStep::master_setup);
 }
 
 int32_t OST7720_CALL ost7720_armMeasureSlaveFinish(int32_t session, int32_t slave) {
-    Api api("ost7720_armMeasureSlaveFinish", session, {trace_int(session), trace_int(slave)});
-    if (api.injected())
-        return api.status();
-    Session* s = api.session(session);
-    if (!s || !single_channel(api, *s, slave, k_any, "slave"))
-        return api.status();
-    return arm_step(api, *s, ArmStep::armed, ArmStep::slave_finished);
+    return arm_on_channel("ost7720_armMeasureSlaveFinish", session, slave, "slave", ArmStep::armed,
+                          ArmStep::slave_finished);
 }
 
 int32_t OST7720_CALL ost7720_armMeasureMasterFinish(int32_t session, int32_t master) {
-    Api api("ost7720_armMeasureMasterFinish", session, {trace_int(session), trace_int(master)});
-    if (api.injected())
-        return api.status();
-    Session* s = api.session(session);
-    if (!s || !single_channel(api, *s, master, k_any, "master"))
-        return api.status();
-    return arm_step(api, *s, ArmStep::slave_finished, ArmStep::master_finished);
+    return arm_on_channel("ost7720_armMeasureMasterFinish", session, master, "master",
+                          ArmStep::slave_finished, ArmStep::master_finished);
 }
 
 int32_t OST7720_CALL ost7720_triggerMeasure(int32_t session, int32_t channel, int32_t reserved) {
